@@ -1,0 +1,73 @@
+#include "command/Command.h"
+
+namespace OrvaneCli::FileSystem {
+
+bool IsFeatureEnabled(Feature feature)
+{
+    const unsigned char* flag = FeatureList[static_cast<int>(feature)];
+    return flag != nullptr && *flag != 0;
+}
+
+std::shared_ptr<ParameterSpec> MakeParameter(const ParameterDecl& decl)
+{
+    auto parameter = ParameterSpec::New(decl.name, decl.type);
+    if (decl.shortName[0] != '\0') {
+        parameter->SetShortName(decl.shortName);
+    }
+    if (decl.description[0] != '\0') {
+        parameter->SetDescription(decl.description);
+    }
+    if (decl.constraint) {
+        parameter->SetConstraint(decl.constraint);
+    }
+    parameter->SetRequired(decl.required);
+    return parameter;
+}
+
+void AddParameter(const std::shared_ptr<InputSpec>& spec, const ParameterDecl& decl)
+{
+    spec->AddParameter(MakeParameter(decl));
+}
+
+std::shared_ptr<ParameterConstraint> IntRange(long min, long max)
+{
+    auto constraint = ParameterConstraint::New(ParameterConstraintType::IntRange);
+    constraint->SetIntRange(min, max);
+    return constraint;
+}
+
+std::shared_ptr<ParameterConstraint> StringEnum(std::initializer_list<std::pair<const char*, const char*>> values)
+{
+    auto constraint = ParameterConstraint::New(ParameterConstraintType::StringEnum);
+    for (const auto& [value, description] : values) {
+        if (description[0] == '\0') {
+            constraint->AddStringEnum(value);
+        } else {
+            constraint->AddStringEnum(value, description);
+        }
+    }
+    return constraint;
+}
+
+std::shared_ptr<OutputSpec> BooleanOutputSpec()
+{
+    auto spec = OutputSpec::New();
+    spec->SetRootObject(MetaBool::New());
+    return spec;
+}
+
+std::shared_ptr<OutputSpec> ListOutputSpec(std::shared_ptr<MetaStruct> prototype)
+{
+    auto spec = OutputSpec::New();
+    spec->SetRootObject(MetaList::New(MetaType::Struct, std::move(prototype)));
+    return spec;
+}
+
+std::shared_ptr<OutputSpec> StructOutputSpec(std::shared_ptr<MetaStruct> structure)
+{
+    auto spec = OutputSpec::New();
+    spec->SetRootObject(std::move(structure));
+    return spec;
+}
+
+} // namespace OrvaneCli::FileSystem

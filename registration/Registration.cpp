@@ -1,0 +1,229 @@
+#include "registration/Registration.h"
+
+#include "command/Command.h"
+#include "filesystem/VolumeRescan.h"
+
+using Quillets::AutoCli::Namespace;
+using Quillets::AutoCli::NamespaceNode;
+using Quillets::QuilletException;
+using namespace OrvaneCli::FileSystem;
+
+namespace {
+
+using NodePtr = std::shared_ptr<NamespaceNode>;
+using NamespacePtr = std::shared_ptr<Namespace>;
+
+NamespacePtr MakeNamespace(const char* description)
+{
+    auto ns = Namespace::New();
+    ns->SetDescription(description);
+    return ns;
+}
+
+// Hands the only owning reference of a new node to the framework.
+void Attach(const NodePtr& parent, const char* name, NodePtr node)
+{
+    parent->RegisterNamespaceNode(std::move(node), name);
+}
+
+// The namespace `name` under `parent`; anything else there is a broken tree.
+NamespacePtr FindNamespace(const NodePtr& parent, const char* name)
+{
+    auto missing = [&] {
+        return QuilletException(HostCtl::Misc::StrPrintf("Unable to find '%s' namespace in namespace '%s'", name,
+                                                          parent->GetName().c_str()));
+    };
+    if (!parent->HasNamespaceNode(name)) {
+        throw missing();
+    }
+    auto ns = std::dynamic_pointer_cast<Namespace>(parent->GetNamespaceNode(name));
+    if (!ns) {
+        throw missing();
+    }
+    return ns;
+}
+
+// Each Build function makes one namespace complete, bottom-up; the caller attaches it.
+
+NamespacePtr BuildFilesystem()
+{
+    auto ns = MakeNamespace("Operations pertaining to filesystems, also known as datastores, on the Zephal host.");
+    Attach(ns, "rescan", VolumeRescan::New());
+    Attach(ns, "automount", VolumeAutomount::New());
+    return ns;
+}
+
+NamespacePtr BuildNfsPreunmountState()
+{
+    auto ns = MakeNamespace("Enter or exit preunmount state.");
+    return ns;
+}
+
+NamespacePtr BuildNfsParam()
+{
+    auto ns = MakeNamespace("Operations on volume parameters of NAS filesystems.");
+    return ns;
+}
+
+NamespacePtr BuildNfsFirewall()
+{
+    auto ns = MakeNamespace("Operations on IP/Mask of nfsClient firewall ruleset");
+    return ns;
+}
+
+NamespacePtr BuildNfs()
+{
+    auto ns = MakeNamespace("Operations to create, manage, and remove Network Attached Storage filesystems.");
+    if (IsFeatureEnabled(Feature::NasPreUnmount)) {
+        Attach(ns, "preunmountstate", BuildNfsPreunmountState());
+    }
+    Attach(ns, "param", BuildNfsParam());
+    Attach(ns, "firewall", BuildNfsFirewall());
+    return ns;
+}
+
+NamespacePtr BuildNfs41Param()
+{
+    auto ns = MakeNamespace("Operations on volume parameters of NFS v4.1 filesystems.");
+    return ns;
+}
+
+NamespacePtr BuildNfs41Firewall()
+{
+    auto ns = MakeNamespace("Operations on IP/Mask of nfs41Client firewall ruleset");
+    return ns;
+}
+
+NamespacePtr BuildNfs41()
+{
+    auto ns = MakeNamespace("Operations to create, manage, and remove NFS v4.1 filesystems.");
+    Attach(ns, "param", BuildNfs41Param());
+    Attach(ns, "firewall", BuildNfs41Firewall());
+    return ns;
+}
+
+NamespacePtr BuildHlfsExtent()
+{
+    auto ns = MakeNamespace("Manage HLFS extents.");
+    return ns;
+}
+
+NamespacePtr BuildHlfsSnapshotExtent()
+{
+    auto ns = MakeNamespace("Manage HLFS snapshot extents.");
+    return ns;
+}
+
+NamespacePtr BuildHlfsSnapshot()
+{
+    auto ns = MakeNamespace("Manage HLFS snapshots.");
+    Attach(ns, "extent", BuildHlfsSnapshotExtent());
+    return ns;
+}
+
+NamespacePtr BuildHlfsLockMode()
+{
+    auto ns = MakeNamespace("Manage HLFS array locking mode.");
+    return ns;
+}
+
+NamespacePtr BuildHlfsHost()
+{
+    auto ns = MakeNamespace("Manage hosts accessing a HLFS volume.");
+    return ns;
+}
+
+NamespacePtr BuildHlfsPbCache()
+{
+    auto ns = MakeNamespace("HLFS Pointer Block Cache statistics.");
+    return ns;
+}
+
+NamespacePtr BuildHlfsReclaimConfig()
+{
+    auto ns = MakeNamespace("HLFS Space Reclamation Configuration Settings");
+    return ns;
+}
+
+NamespacePtr BuildHlfsReclaim()
+{
+    auto ns = MakeNamespace("Manage HLFS Space Reclamation");
+    Attach(ns, "config", BuildHlfsReclaimConfig());
+    return ns;
+}
+
+NamespacePtr BuildHlfs()
+{
+    auto ns = MakeNamespace("HLFS operations.");
+    Attach(ns, "extent", BuildHlfsExtent());
+    Attach(ns, "snapshot", BuildHlfsSnapshot());
+    Attach(ns, "lockmode", BuildHlfsLockMode());
+    Attach(ns, "host", BuildHlfsHost());
+    Attach(ns, "pbcache", BuildHlfsPbCache());
+    Attach(ns, "reclaim", BuildHlfsReclaim());
+    return ns;
+}
+
+NamespacePtr BuildNmpBoot()
+{
+    auto ns = MakeNamespace("Operations pertaining to the boot time configuration of the NMP plugin.");
+    return ns;
+}
+
+NamespacePtr BuildNmp()
+{
+    auto ns = MakeNamespace("Orvane Native Multipath Plugin (NMP). This is the Orvane default implementation of the "
+                            "Pluggable Storage Architecture.");
+    Attach(ns, "boot", BuildNmpBoot());
+    return ns;
+}
+
+NamespacePtr BuildClusteredHdsk()
+{
+    auto ns = MakeNamespace("Manage clustered HDSK support.");
+    return ns;
+}
+
+} // namespace
+
+extern "C" {
+
+void AutoCli_RegisterNamespaces(std::shared_ptr<NamespaceNode> root)
+{
+    Core_RegisterInternalNamespaces(root);
+}
+
+void Core_RegisterInternalNamespaces(std::shared_ptr<NamespaceNode> root)
+{
+    const NamespacePtr storage = FindNamespace(root, "storage");
+    NamespacePtr internal;
+    if (storage->HasNamespaceNode("internal")) {
+        internal = FindNamespace(storage, "internal");
+    } else {
+        internal = MakeNamespace("Orvane internal storage commands.");
+        Attach(storage, "internal", internal);
+    }
+    Attach(internal, "core", MakeNamespace("Orvane core storage commands. No operations are currently internal only."));
+    Nmp_RegisterInternalNamespaces(internal);
+    ClusteredHdsk_RegisterInternalNamespace(internal);
+}
+
+void Nmp_RegisterInternalNamespaces(std::shared_ptr<NamespaceNode> parent)
+{
+    Attach(parent, "nmp", BuildNmp());
+}
+
+void ClusteredHdsk_RegisterInternalNamespace(std::shared_ptr<NamespaceNode> parent)
+{
+    Attach(parent, "clusteredhdsk", BuildClusteredHdsk());
+}
+
+void FilesystemNfs_RegisterNamespaces(std::shared_ptr<NamespaceNode> parent)
+{
+    Attach(parent, "filesystem", BuildFilesystem());
+    Attach(parent, "nfs", BuildNfs());
+    Attach(parent, "nfs41", BuildNfs41());
+    Attach(parent, "hlfs", BuildHlfs());
+}
+
+} // extern "C"
