@@ -1,7 +1,19 @@
 #include "registration/Registration.h"
 
 #include "command/Command.h"
+#include "filesystem/VolumeList.h"
+#include "filesystem/VolumeMount.h"
 #include "filesystem/VolumeRescan.h"
+#include "hlfs/HLFSPBCache.h"
+#include "hlfs/HLFSReclaimConfig.h"
+#include "hlfs/HLFSVolumeUnmap.h"
+#include "internal/BootRestore.h"
+#include "internal/ClusteredHdsk.h"
+#include "nfs/NFS41VolumeAdd.h"
+#include "nfs/NFSVolumeAdd.h"
+#include "nfs/NFSVolumePreunmount.h"
+#include "nfs/NFSVolumeRemove.h"
+#include "hlfs/HLFSExtentList.h"
 
 using Quillets::AutoCli::Namespace;
 using Quillets::AutoCli::NamespaceNode;
@@ -48,7 +60,10 @@ NamespacePtr FindNamespace(const NodePtr& parent, const char* name)
 NamespacePtr BuildFilesystem()
 {
     auto ns = MakeNamespace("Operations pertaining to filesystems, also known as datastores, on the Zephal host.");
+    Attach(ns, "list", VolumeList::New());
     Attach(ns, "rescan", VolumeRescan::New());
+    Attach(ns, "mount", VolumeMount::New());
+    Attach(ns, "unmount", VolumeUnmount::New());
     Attach(ns, "automount", VolumeAutomount::New());
     return ns;
 }
@@ -56,6 +71,8 @@ NamespacePtr BuildFilesystem()
 NamespacePtr BuildNfsPreunmountState()
 {
     auto ns = MakeNamespace("Enter or exit preunmount state.");
+    Attach(ns, "enter", NFSVolumePreunmountEnter::New());
+    Attach(ns, "exit", NFSVolumePreunmountExit::New());
     return ns;
 }
 
@@ -74,6 +91,8 @@ NamespacePtr BuildNfsFirewall()
 NamespacePtr BuildNfs()
 {
     auto ns = MakeNamespace("Operations to create, manage, and remove Network Attached Storage filesystems.");
+    Attach(ns, "add", NFSVolumeAdd::New());
+    Attach(ns, "remove", NFSVolumeRemove::New());
     if (IsFeatureEnabled(Feature::NasPreUnmount)) {
         Attach(ns, "preunmountstate", BuildNfsPreunmountState());
     }
@@ -97,6 +116,8 @@ NamespacePtr BuildNfs41Firewall()
 NamespacePtr BuildNfs41()
 {
     auto ns = MakeNamespace("Operations to create, manage, and remove NFS v4.1 filesystems.");
+    Attach(ns, "add", NFS41VolumeAdd::New());
+    Attach(ns, "remove", NFS41VolumeRemove::New());
     Attach(ns, "param", BuildNfs41Param());
     Attach(ns, "firewall", BuildNfs41Firewall());
     return ns;
@@ -105,6 +126,7 @@ NamespacePtr BuildNfs41()
 NamespacePtr BuildHlfsExtent()
 {
     auto ns = MakeNamespace("Manage HLFS extents.");
+    Attach(ns, "list", HLFSExtentList::New());
     return ns;
 }
 
@@ -136,12 +158,16 @@ NamespacePtr BuildHlfsHost()
 NamespacePtr BuildHlfsPbCache()
 {
     auto ns = MakeNamespace("HLFS Pointer Block Cache statistics.");
+    Attach(ns, "get", HLFSPBCacheGet::New());
+    Attach(ns, "reset", HLFSPBCacheReset::New());
     return ns;
 }
 
 NamespacePtr BuildHlfsReclaimConfig()
 {
     auto ns = MakeNamespace("HLFS Space Reclamation Configuration Settings");
+    Attach(ns, "get", HLFSReclaimConfigGet::New());
+    Attach(ns, "set", HLFSReclaimConfigSet::New());
     return ns;
 }
 
@@ -155,6 +181,8 @@ NamespacePtr BuildHlfsReclaim()
 NamespacePtr BuildHlfs()
 {
     auto ns = MakeNamespace("HLFS operations.");
+    Attach(ns, "upgrade", HLFSVolumeUpgrade::New());
+    Attach(ns, "unmap", HLFSVolumeUnmap::New());
     Attach(ns, "extent", BuildHlfsExtent());
     Attach(ns, "snapshot", BuildHlfsSnapshot());
     Attach(ns, "lockmode", BuildHlfsLockMode());
@@ -167,6 +195,7 @@ NamespacePtr BuildHlfs()
 NamespacePtr BuildNmpBoot()
 {
     auto ns = MakeNamespace("Operations pertaining to the boot time configuration of the NMP plugin.");
+    Attach(ns, "restore", OrvaneCli::Nmp::BootRestore::New());
     return ns;
 }
 
@@ -181,6 +210,8 @@ NamespacePtr BuildNmp()
 NamespacePtr BuildClusteredHdsk()
 {
     auto ns = MakeNamespace("Manage clustered HDSK support.");
+    Attach(ns, "get", ClusteredHdskGet::New());
+    Attach(ns, "set", ClusteredHdskSet::New());
     return ns;
 }
 
