@@ -1,0 +1,139 @@
+#include "nfs/NFSVolumeAdd.h"
+
+#include <optional>
+
+#include "nfs/NfsAddCommon.h"
+
+namespace OrvaneCli::FileSystem {
+
+namespace {
+
+constexpr const char* kHost = "host";
+constexpr const char* kConnections = "connections";
+constexpr const char* kMountRetry = "unsupported-mount-retry";
+constexpr const char* kQueueDepth = "unsupported-queue-depth";
+
+// Where the server is reached: through a named knxnic only when given as host-knxnic.
+struct NfsServer {
+    std::string host;
+    bool knxnicBound = false;
+    std::string knxnic;
+};
+
+// Empty when the server arguments do not fit; the reason is already on `out`.
+std::optional<NfsServer> ReadServer(const InputPtr& in, const OutputPtr& out)
+{
+    if (!IsFeatureEnabled(Feature::NfsKnxnicBinding)) {
+        return NfsServer{in->GetParameter(kHost), false, ""};
+    }
+    const std::string& hostKnxnic = in->GetParameter(NfsAddArg::kHostKnxnic);
+    const std::string& host = in->GetParameter(kHost);
+    if (IsGiven(hostKnxnic) == IsGiven(host)) {
+        // Scripts match this text, misspelling included.
+        out->AddErrorMessage("Either hostName or knxnic shoud be provided");
+        return std::nullopt;
+    }
+    if (IsGiven(host)) {
+        return NfsServer{host, false, ""};
+    }
+    // Split at the first ":knx", so IPv6 addresses keep their colons.
+    const auto colon = hostKnxnic.find(":knx");
+    if (colon == std::string::npos) {
+        out->AddErrorMessage("Invalid host-knxnic input");
+        return std::nullopt;
+    }
+    return NfsServer{hostKnxnic.substr(0, colon), true, hostKnxnic.substr(colon + 1)};
+}
+
+} // namespace
+
+std::shared_ptr<NFSVolumeAdd> NFSVolumeAdd::New() { return std::shared_ptr<NFSVolumeAdd>(new NFSVolumeAdd()); }
+
+NFSVolumeAdd::NFSVolumeAdd()
+{
+    SetDescription("Add a new NAS volume to the Zephal Host and mount it with the given volume name.");
+}
+
+NFSVolumeAdd::~NFSVolumeAdd() = default;
+
+std::shared_ptr<InputSpec> NFSVolumeAdd::GetInputSpecInternal()
+{
+    const bool knxnicBinding = IsFeatureEnabled(Feature::NfsKnxnicBinding);
+    auto spec = InputSpec::New();
+    AddParameter(spec, {kHost, "H", ParameterType::String,
+                        "The hostname or IP address of the NAS volume to add and mount on the system.", !knxnicBinding});
+    if (knxnicBinding) {
+        AddParameter(spec, {NfsAddArg::kHostKnxnic, "I", ParameterType::String,
+                            "The hostname or IP address of the NAS volume to add, followed by a colon(:) and knxnic "
+                            "name i.e. <host/IP>:<knxnic> "});
+    }
+    AddParameter(spec, {NfsAddArg::kShare, "s", ParameterType::String,
+                        "The share name on the remote system to use for this NAS mount point.", true});
+    AddParameter(spec, {NfsAddArg::kVolumeName, "v", ParameterType::String,
+                        "The volume name to use for the NAS mount.  This must be a unique volume name and cannot "
+                        "conflict with existing NAS, HLFS or other volume names.",
+                        true});
+    if (IsFeatureEnabled(Feature::NfsConnections)) {
+        AddParameter(spec, {kConnections, "c", ParameterType::Int,
+                            "The number of RPC connections to be established for the NFS datastore. Minimum and "
+                            "default values are 1 and maximum is 8. A higher number of connections yields better "
+                            "performance on datastores with higher IO load.",
+                            false, IntRange(1, 8)});
+    }
+    AddParameter(spec, {NfsAddArg::kReadOnly, "r", ParameterType::Flag,
+                        "If set this flag will set the mount point to be read-only."});
+    AddParameter(spec, {NfsAddArg::kIsPE, "p", ParameterType::Flag, "If set this flag will set the mount point to be PE."});
+    AddParameter(spec, {kMountRetry, "", ParameterType::Flag, ""});
+    AddParameter(spec, {kQueueDepth, "", ParameterType::Int, "", false, IntRange(1, 4294967295L)});
+    return spec;
+}
+
+std::shared_ptr<OutputSpec> NFSVolumeAdd::GetOutputSpecInternal() { return BooleanOutputSpec(); }
+
+void NFSVolumeAdd::ExecuteInternal(const InputPtr& in, const OutputPtr& out)
+{
+    const std::string& share = in->GetParameter(NfsAddArg::kShare);
+    const std::string& volumeName = in->GetParameter(NfsAddArg::kVolumeName);
+    const bool readOnly = in->IsFlagSet(NfsAddArg::kReadOnly);
+
+    std::int64_t connections = 1;
+    if (IsFeatureEnabled(Feature::NfsConnections) && in->HasParameter(kConnections)) {
+        connections = in->GetParameterInt(kConnections);
+    }
+
+    const std::optional<NfsServer> server = ReadServer(in, out);
+    if (!server) {
+        return;
+    }
+
+    const bool isPE = in->IsFlagSet(NfsAddArg::kIsPE);
+    const bool mountRetry = in->IsFlagSet(kMountRetry);
+
+    std::uint32_t queueDepth = 0; // none given
+    if (in->HasParameter(kQueueDepth)) {
+        if (!mountRetry) {
+            out->AddErrorMessage("unsupported-queue-depth requires unsupported-mount-retry flag");
+            return;
+        }
+        queueDepth = static_cast<std::uint32_t>(in->GetParameterInt(kQueueDepth));
+    }
+
+    WithStorageInfo(StorageInfoPlacement::OutsideGuard, out, [&](StorageInfoImpl& storage) {
+        const std::unique_ptr<NetworkFileSystem> volume = storage.AddNetworkFileSystem(
+            server->host, share, volumeName, server->knxnicBound, server->knxnic, queueDepth, connections);
+        if (!volume) {
+            out->AddErrorMessage(NoNewVolumeMessage(volumeName));
+            return;
+        }
+        // With pre-unmount support the host manages the life of an unmounted definition:
+        // the mount is made without the retry flag and a failed one keeps the definition.
+        const bool preUnmount = IsFeatureEnabled(Feature::NasPreUnmount);
+        const unsigned flags = preUnmount ? kNfsMountNoFlags : (mountRetry ? kNfsMountRetry : kNfsMountNoFlags);
+        const OnMountFailure onFailure = preUnmount ? OnMountFailure::KeepDefinition : OnMountFailure::RemoveDefinition;
+        if (ConfigureAndMount(storage, *volume, volumeName, readOnly, isPE, flags, onFailure, out)) {
+            out->SetRootObject(MetaBool::New(true));
+        }
+    });
+}
+
+} // namespace OrvaneCli::FileSystem
