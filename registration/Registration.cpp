@@ -9,11 +9,6 @@
 #include "hlfs/HLFSVolumeUnmap.h"
 #include "internal/BootRestore.h"
 #include "internal/ClusteredHdsk.h"
-#include "hlfs/HLFSPBCache.h"
-#include "hlfs/HLFSReclaimConfig.h"
-#include "hlfs/HLFSVolumeUnmap.h"
-#include "internal/BootRestore.h"
-#include "internal/ClusteredHdsk.h"
 #include "nfs/NFS41VolumeAdd.h"
 #include "nfs/NFSVolumeAdd.h"
 #include "nfs/NFSVolumePreunmount.h"
@@ -165,16 +160,12 @@ NamespacePtr BuildHlfsPbCache()
     auto ns = MakeNamespace("HLFS Pointer Block Cache statistics.");
     Attach(ns, "get", HLFSPBCacheGet::New());
     Attach(ns, "reset", HLFSPBCacheReset::New());
-    Attach(ns, "get", HLFSPBCacheGet::New());
-    Attach(ns, "reset", HLFSPBCacheReset::New());
     return ns;
 }
 
 NamespacePtr BuildHlfsReclaimConfig()
 {
     auto ns = MakeNamespace("HLFS Space Reclamation Configuration Settings");
-    Attach(ns, "get", HLFSReclaimConfigGet::New());
-    Attach(ns, "set", HLFSReclaimConfigSet::New());
     Attach(ns, "get", HLFSReclaimConfigGet::New());
     Attach(ns, "set", HLFSReclaimConfigSet::New());
     return ns;
@@ -192,8 +183,6 @@ NamespacePtr BuildHlfs()
     auto ns = MakeNamespace("HLFS operations.");
     Attach(ns, "upgrade", HLFSVolumeUpgrade::New());
     Attach(ns, "unmap", HLFSVolumeUnmap::New());
-    Attach(ns, "upgrade", HLFSVolumeUpgrade::New());
-    Attach(ns, "unmap", HLFSVolumeUnmap::New());
     Attach(ns, "extent", BuildHlfsExtent());
     Attach(ns, "snapshot", BuildHlfsSnapshot());
     Attach(ns, "lockmode", BuildHlfsLockMode());
@@ -206,7 +195,6 @@ NamespacePtr BuildHlfs()
 NamespacePtr BuildNmpBoot()
 {
     auto ns = MakeNamespace("Operations pertaining to the boot time configuration of the NMP plugin.");
-    Attach(ns, "restore", OrvaneCli::Nmp::BootRestore::New());
     Attach(ns, "restore", OrvaneCli::Nmp::BootRestore::New());
     return ns;
 }
@@ -222,8 +210,6 @@ NamespacePtr BuildNmp()
 NamespacePtr BuildClusteredHdsk()
 {
     auto ns = MakeNamespace("Manage clustered HDSK support.");
-    Attach(ns, "get", ClusteredHdskGet::New());
-    Attach(ns, "set", ClusteredHdskSet::New());
     Attach(ns, "get", ClusteredHdskGet::New());
     Attach(ns, "set", ClusteredHdskSet::New());
     return ns;
