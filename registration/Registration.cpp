@@ -6,6 +6,10 @@
 #include "filesystem/VolumeRescan.h"
 #include "hlfs/HLFSPBCache.h"
 #include "hlfs/HLFSReclaimConfig.h"
+#include "hlfs/HLFSSnapshotList.h"
+#include "hlfs/HLFSSnapshotMount.h"
+#include "hlfs/HLFSVolumeHostList.h"
+#include "hlfs/HLFSVolumeLockMode.h"
 #include "hlfs/HLFSVolumeUnmap.h"
 #include "internal/BootRestore.h"
 #include "internal/ClusteredHdsk.h"
@@ -133,12 +137,16 @@ NamespacePtr BuildHlfsExtent()
 NamespacePtr BuildHlfsSnapshotExtent()
 {
     auto ns = MakeNamespace("Manage HLFS snapshot extents.");
+    Attach(ns, "list", HLFSSnapshotExtentList::New());
     return ns;
 }
 
 NamespacePtr BuildHlfsSnapshot()
 {
     auto ns = MakeNamespace("Manage HLFS snapshots.");
+    Attach(ns, "list", HLFSSnapshotList::New());
+    Attach(ns, "mount", HLFSSnapshotMount::New());
+    Attach(ns, "resignature", HLFSSnapshotResignature::New());
     Attach(ns, "extent", BuildHlfsSnapshotExtent());
     return ns;
 }
@@ -146,12 +154,15 @@ NamespacePtr BuildHlfsSnapshot()
 NamespacePtr BuildHlfsLockMode()
 {
     auto ns = MakeNamespace("Manage HLFS array locking mode.");
+    Attach(ns, "list", HLFSVolumeLockModeList::New());
+    Attach(ns, "set", HLFSVolumeLockModeSet::New());
     return ns;
 }
 
 NamespacePtr BuildHlfsHost()
 {
     auto ns = MakeNamespace("Manage hosts accessing a HLFS volume.");
+    Attach(ns, "list", HLFSVolumeHostList::New());
     return ns;
 }
 

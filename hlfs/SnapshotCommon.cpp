@@ -1,0 +1,52 @@
+#include "hlfs/SnapshotCommon.h"
+
+#include <array>
+
+namespace OrvaneCli::FileSystem {
+
+const char* TranslateSnapshotReason(unsigned code)
+{
+    static constexpr std::array<const char*, 8> reasons = {
+        "ok",
+        "duplicate extents found",
+        "some extents missing",
+        "extra extents found",
+        "failed to check for existing active volumes",
+        "the volume is being actively used",
+        "the original volume is still online",
+        "the original volume has some extents online",
+    };
+    return code < reasons.size() ? reasons[code] : "unknown error";
+}
+
+void AddSnapshotSelectionParameters(const std::shared_ptr<InputSpec>& spec, const char* labelDescription,
+                                    const char* uuidDescription)
+{
+    AddParameter(spec, {"volume-label", "l", ParameterType::String, labelDescription});
+    AddParameter(spec, {"volume-uuid", "u", ParameterType::String, uuidDescription});
+}
+
+SnapshotSelection SnapshotSelection::FromInput(const InputPtr& in)
+{
+    return {in->GetParameter("volume-label"), in->GetParameter("volume-uuid")};
+}
+
+bool SnapshotSelection::Matches(UnresolvedHlfsVolumeImpl& volume) const
+{
+    if (IsGiven(uuid) && volume.GetUuid() != uuid) {
+        return false;
+    }
+    return !IsGiven(label) || volume.GetVolumeName() == label;
+}
+
+UnresolvedHlfsVolumeImpl* AsSnapshot(const std::unique_ptr<UnresolvedHlfsVolume>& entry)
+{
+    return dynamic_cast<UnresolvedHlfsVolumeImpl*>(entry.get());
+}
+
+UnresolvedHlfsExtentImpl* AsSnapshotExtent(const std::unique_ptr<UnresolvedHlfsExtent>& entry)
+{
+    return dynamic_cast<UnresolvedHlfsExtentImpl*>(entry.get());
+}
+
+} // namespace OrvaneCli::FileSystem
