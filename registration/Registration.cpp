@@ -15,6 +15,9 @@
 #include "internal/ClusteredHdsk.h"
 #include "nfs/NFS41VolumeAdd.h"
 #include "nfs/NFSVolumeAdd.h"
+#include "nfs/NFSVolumeList.h"
+#include "nfs/NFSVolumeParam.h"
+#include "nfs/NasFirewall.h"
 #include "nfs/NFSVolumePreunmount.h"
 #include "nfs/NFSVolumeRemove.h"
 #include "hlfs/HLFSExtentList.h"
@@ -83,12 +86,17 @@ NamespacePtr BuildNfsPreunmountState()
 NamespacePtr BuildNfsParam()
 {
     auto ns = MakeNamespace("Operations on volume parameters of NAS filesystems.");
+    Attach(ns, "get", NFSVolumeParamGet::New());
+    Attach(ns, "set", NFSVolumeParamSet::New());
     return ns;
 }
 
 NamespacePtr BuildNfsFirewall()
 {
     auto ns = MakeNamespace("Operations on IP/Mask of nfsClient firewall ruleset");
+    Attach(ns, "add", NFSFirewallAdd::New());
+    Attach(ns, "remove", NFSFirewallRemove::New());
+    Attach(ns, "list", NFSFirewallList::New());
     return ns;
 }
 
@@ -97,6 +105,7 @@ NamespacePtr BuildNfs()
     auto ns = MakeNamespace("Operations to create, manage, and remove Network Attached Storage filesystems.");
     Attach(ns, "add", NFSVolumeAdd::New());
     Attach(ns, "remove", NFSVolumeRemove::New());
+    Attach(ns, "list", NFSVolumeList::New());
     if (IsFeatureEnabled(Feature::NasPreUnmount)) {
         Attach(ns, "preunmountstate", BuildNfsPreunmountState());
     }
@@ -108,12 +117,17 @@ NamespacePtr BuildNfs()
 NamespacePtr BuildNfs41Param()
 {
     auto ns = MakeNamespace("Operations on volume parameters of NFS v4.1 filesystems.");
+    Attach(ns, "get", NFS41VolumeParamGet::New());
+    Attach(ns, "set", NFS41VolumeParamSet::New());
     return ns;
 }
 
 NamespacePtr BuildNfs41Firewall()
 {
     auto ns = MakeNamespace("Operations on IP/Mask of nfs41Client firewall ruleset");
+    Attach(ns, "add", NFS41FirewallAdd::New());
+    Attach(ns, "remove", NFS41FirewallRemove::New());
+    Attach(ns, "list", NFS41FirewallList::New());
     return ns;
 }
 
@@ -122,6 +136,7 @@ NamespacePtr BuildNfs41()
     auto ns = MakeNamespace("Operations to create, manage, and remove NFS v4.1 filesystems.");
     Attach(ns, "add", NFS41VolumeAdd::New());
     Attach(ns, "remove", NFS41VolumeRemove::New());
+    Attach(ns, "list", NFS41VolumeList::New());
     Attach(ns, "param", BuildNfs41Param());
     Attach(ns, "firewall", BuildNfs41Firewall());
     return ns;
