@@ -1,0 +1,220 @@
+#include <fcntl.h>
+#include <poll.h>
+#include <signal.h>
+#include <spawn.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <cstdlib>
+#include <ctime>
+#include <string>
+
+#include <nlohmann/json.hpp>
+
+#include "quillets/AutoCli.h"
+
+extern char** environ;
+
+namespace Quillets::AutoCli {
+
+namespace {
+
+// Appends one line to the call journal named by AUTOCLI_JOURNAL, in the host's journal format.
+void Journal(const std::string& command, const std::string& input)
+{
+    const char* path = std::getenv("AUTOCLI_JOURNAL");
+    if (path == nullptr || *path == '\0') {
+        return;
+    }
+    nlohmann::ordered_json entry;
+    entry["call"] = "AutoCli_ShellCmd";
+    entry["target"] = "";
+    entry["args"] = nlohmann::ordered_json::array({command, input});
+    const std::string line = entry.dump(-1, ' ', false, nlohmann::json::error_handler_t::replace) + "\n";
+    const int fd = ::open(path, O_WRONLY | O_APPEND | O_CREAT | O_CLOEXEC, 0644);
+    if (fd < 0) {
+        return;
+    }
+    // One write per line keeps lines whole when several writers append.
+    std::size_t done = 0;
+    while (done < line.size()) {
+        const ssize_t n = ::write(fd, line.data() + done, line.size() - done);
+        if (n < 0 && errno == EINTR) {
+            continue;
+        }
+        if (n <= 0) {
+            break;
+        }
+        done += static_cast<std::size_t>(n);
+    }
+    ::close(fd);
+}
+
+class Fd {
+public:
+    explicit Fd(int fd = -1) : fd_(fd) {}
+    ~Fd() { Close(); }
+    Fd(const Fd&) = delete;
+    Fd& operator=(const Fd&) = delete;
+    int Get() const { return fd_; }
+    void Reset(int fd) { Close(); fd_ = fd; }
+    void Close()
+    {
+        if (fd_ >= 0) {
+            ::close(fd_);
+            fd_ = -1;
+        }
+    }
+
+private:
+    int fd_;
+};
+
+// Writing to a child that stopped reading must not kill this process: SIGPIPE is
+// blocked for the exchange and a pending one is consumed before it is unblocked.
+class SigPipeGuard {
+public:
+    SigPipeGuard()
+    {
+        sigemptyset(&pipeSet_);
+        sigaddset(&pipeSet_, SIGPIPE);
+        sigset_t pending;
+        sigpending(&pending);
+        wasPending_ = sigismember(&pending, SIGPIPE) == 1;
+        pthread_sigmask(SIG_BLOCK, &pipeSet_, &old_);
+    }
+    ~SigPipeGuard()
+    {
+        if (raised_ && !wasPending_) {
+            const timespec zero{0, 0};
+            while (sigtimedwait(&pipeSet_, nullptr, &zero) < 0 && errno == EINTR) {
+            }
+        }
+        pthread_sigmask(SIG_SETMASK, &old_, nullptr);
+    }
+    SigPipeGuard(const SigPipeGuard&) = delete;
+    SigPipeGuard& operator=(const SigPipeGuard&) = delete;
+    void Raised() { raised_ = true; }
+
+private:
+    sigset_t pipeSet_{};
+    sigset_t old_{};
+    bool wasPending_ = false;
+    bool raised_ = false;
+};
+
+bool MakePipe(Fd& readEnd, Fd& writeEnd)
+{
+    int fds[2];
+    if (::pipe2(fds, O_CLOEXEC) != 0) {
+        return false;
+    }
+    readEnd.Reset(fds[0]);
+    writeEnd.Reset(fds[1]);
+    return true;
+}
+
+} // namespace
+
+int AutoCli_ShellCmd(const std::string& command, std::string& output, const std::string& input)
+{
+    Journal(command, input);
+    output.clear();
+
+    Fd inRead, inWrite, outRead, outWrite;
+    if (!MakePipe(inRead, inWrite) || !MakePipe(outRead, outWrite)) {
+        return -1;
+    }
+
+    posix_spawn_file_actions_t actions;
+    if (posix_spawn_file_actions_init(&actions) != 0) {
+        return -1;
+    }
+    posix_spawn_file_actions_adddup2(&actions, inRead.Get(), STDIN_FILENO);
+    posix_spawn_file_actions_adddup2(&actions, outWrite.Get(), STDOUT_FILENO);
+    posix_spawn_file_actions_adddup2(&actions, outWrite.Get(), STDERR_FILENO);
+
+    SigPipeGuard sigPipe;
+    // The child starts with default signal handling and an empty mask.
+    posix_spawnattr_t attributes;
+    posix_spawnattr_init(&attributes);
+    sigset_t none;
+    sigemptyset(&none);
+    sigset_t defaults;
+    sigemptyset(&defaults);
+    sigaddset(&defaults, SIGPIPE);
+    posix_spawnattr_setsigmask(&attributes, &none);
+    posix_spawnattr_setsigdefault(&attributes, &defaults);
+    posix_spawnattr_setflags(&attributes, POSIX_SPAWN_SETSIGMASK | POSIX_SPAWN_SETSIGDEF);
+
+    const char* argv[] = {"sh", "-c", command.c_str(), nullptr};
+    pid_t pid = -1;
+    const int spawned =
+        posix_spawn(&pid, "/bin/sh", &actions, &attributes, const_cast<char* const*>(argv), environ);
+    posix_spawn_file_actions_destroy(&actions);
+    posix_spawnattr_destroy(&attributes);
+    inRead.Close();
+    outWrite.Close();
+    if (spawned != 0) {
+        return -1;
+    }
+
+    // Feed the input and drain the output together, so that neither side can block the other.
+    ::fcntl(inWrite.Get(), F_SETFL, ::fcntl(inWrite.Get(), F_GETFL) | O_NONBLOCK);
+    std::size_t written = 0;
+    if (input.empty()) {
+        inWrite.Close();
+    }
+    char buffer[65536];
+    while (outRead.Get() >= 0) {
+        pollfd fds[2];
+        nfds_t count = 0;
+        fds[count++] = {outRead.Get(), POLLIN, 0};
+        if (inWrite.Get() >= 0) {
+            fds[count++] = {inWrite.Get(), POLLOUT, 0};
+        }
+        if (::poll(fds, count, -1) < 0) {
+            if (errno == EINTR) {
+                continue;
+            }
+            break;
+        }
+        if (count > 1 && fds[1].revents != 0) {
+            const ssize_t n = ::write(inWrite.Get(), input.data() + written, input.size() - written);
+            if (n > 0) {
+                written += static_cast<std::size_t>(n);
+            } else if (n < 0 && errno == EPIPE) {
+                sigPipe.Raised();
+            }
+            if ((n < 0 && errno != EAGAIN && errno != EINTR) || written == input.size()) {
+                inWrite.Close();
+            }
+        }
+        if (fds[0].revents != 0) {
+            const ssize_t n = ::read(outRead.Get(), buffer, sizeof buffer);
+            if (n > 0) {
+                output.append(buffer, static_cast<std::size_t>(n));
+            } else if (n == 0 || (errno != EINTR && errno != EAGAIN)) {
+                outRead.Close();
+            }
+        }
+    }
+    inWrite.Close();
+
+    int status = 0;
+    while (::waitpid(pid, &status, 0) < 0) {
+        if (errno != EINTR) {
+            return -1;
+        }
+    }
+    if (WIFEXITED(status)) {
+        return WEXITSTATUS(status);
+    }
+    if (WIFSIGNALED(status)) {
+        return 128 + WTERMSIG(status);
+    }
+    return -1;
+}
+
+} // namespace Quillets::AutoCli

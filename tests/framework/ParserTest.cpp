@@ -1,0 +1,220 @@
+#include <gtest/gtest.h>
+
+#include "FakeCommand.h"
+#include "framework/Help.h"
+#include "framework/Parser.h"
+
+using namespace Quillets::Cli;
+using namespace FrameworkTest;
+using Quillets::AutoCli::Namespace;
+using Quillets::AutoCli::NamespaceNode;
+
+namespace {
+
+std::shared_ptr<ParameterConstraint> Range(long min, long max)
+{
+    auto constraint = ParameterConstraint::New(ParameterConstraintType::IntRange);
+    constraint->SetIntRange(min, max);
+    return constraint;
+}
+
+std::shared_ptr<ParameterConstraint> Levels()
+{
+    auto constraint = ParameterConstraint::New(ParameterConstraintType::StringEnum);
+    constraint->AddStringEnum("low", "Little");
+    constraint->AddStringEnum("high");
+    return constraint;
+}
+
+// storage volume set, with one parameter of every kind.
+struct Tree {
+    std::shared_ptr<NamespaceNode> root = Namespace::New();
+    std::shared_ptr<FakeCommand> set = FakeCommand::New("Change a volume.");
+
+    Tree()
+    {
+        auto storage = Namespace::New();
+        auto volume = Namespace::New();
+        volume->SetDescription("Volume operations.");
+        set->describe = [](InputSpec& spec, FakeCommand& self) {
+            spec.AddParameter(Param("name", "n", ParameterType::String, true));
+            spec.AddParameter(Param("depth", "q", ParameterType::Int, false, Range(1, 4294967295L)));
+            spec.AddParameter(Param("big", "", ParameterType::Int));
+            spec.AddParameter(Param("enabled", "e", ParameterType::Bool));
+            spec.AddParameter(Param("force", "f", ParameterType::Flag));
+            spec.AddParameter(Param("hosts", "H", ParameterType::StringList));
+            spec.AddParameter(Param("level", "l", ParameterType::String, false, Levels()));
+            spec.AddParameter(Param("Index", "I", ParameterType::String));
+            spec.AddParameter(Param("index", "i", ParameterType::String));
+            self.AddExample("-n vol1", "Change vol1.");
+        };
+        set->shape = [] { return MetaList::New(MetaType::Struct, VolumeShape()); };
+        volume->RegisterNamespaceNode(set, "set");
+        storage->RegisterNamespaceNode(volume, "volume");
+        root->RegisterNamespaceNode(storage, "storage");
+    }
+
+    Invocation Parse(std::vector<std::string> args)
+    {
+        args.insert(args.begin(), {"storage", "volume", "set"});
+        return ParseCommandLine(root, args);
+    }
+};
+
+TEST(Parser, ReadsEveryParameterKind)
+{
+    Tree tree;
+    auto inv = tree.Parse({"-n", "-dash-", "--depth=4294967295", "--big", "-9223372036854775808", "-e", "OFF", "-f",
+                           "-H", "a,b", "--hosts", "c", "-l", "low", "-I", "upper", "-i", "lower"});
+    ASSERT_EQ(inv.action, Invocation::Action::Run) << inv.error;
+    const auto& in = *inv.input;
+    EXPECT_EQ(in.GetParameter("name"), "-dash-");
+    EXPECT_EQ(in.GetParameterInt("depth"), 4294967295LL);
+    EXPECT_EQ(in.GetParameterInt("big"), INT64_MIN);
+    EXPECT_TRUE(in.HasParameter("enabled"));
+    EXPECT_FALSE(in.GetParameterBool("enabled"));
+    EXPECT_TRUE(in.IsFlagSet("force"));
+    std::vector<std::string> hosts;
+    in.GetParameterList("hosts", hosts);
+    EXPECT_EQ(hosts, (std::vector<std::string>{"a", "b", "c"}));
+    EXPECT_EQ(in.GetParameter("level"), "low");
+    EXPECT_EQ(in.GetParameter("Index"), "upper");
+    EXPECT_EQ(in.GetParameter("index"), "lower");
+    EXPECT_FALSE(in.HasParameter("missing"));
+}
+
+TEST(Parser, GlobalOptionsBeforeAndAfterThePath)
+{
+    Tree tree;
+    auto inv = ParseCommandLine(tree.root, {"--state", "/tmp/s.json", "--formatter=json", "storage", "volume", "set",
+                                            "-n", "x", "--format-param", "fields=Size, Name", "--format-param=show-header=no"});
+    ASSERT_EQ(inv.action, Invocation::Action::Run) << inv.error;
+    EXPECT_EQ(inv.globals.statePath, "/tmp/s.json");
+    EXPECT_EQ(inv.globals.output.formatter, "json");
+    EXPECT_EQ(inv.globals.output.fields, (std::vector<std::string>{"Size", "Name"}));
+    EXPECT_FALSE(inv.globals.output.showHeader);
+}
+
+struct UsageCase {
+    const char* name;
+    std::vector<std::string> args; // after "storage volume set" unless `whole`
+    bool whole;
+    const char* expected;
+};
+
+class UsageErrors : public ::testing::TestWithParam<UsageCase> {};
+
+TEST_P(UsageErrors, NameTheProblemAndPointToHelp)
+{
+    const auto& c = GetParam();
+    Tree tree;
+    auto inv = c.whole ? ParseCommandLine(tree.root, c.args) : tree.Parse(c.args);
+    EXPECT_EQ(inv.action, Invocation::Action::UsageError);
+    EXPECT_EQ(inv.error, c.expected);
+    EXPECT_EQ(inv.error.find('\n'), std::string::npos);
+    EXPECT_EQ(tree.set->executions, 0);
+}
+
+const char* const kSetHelp = " See 'autocli storage volume set --help'.";
+
+INSTANTIATE_TEST_SUITE_P(
+    EachClass, UsageErrors,
+    ::testing::Values(
+        UsageCase{"unknown_namespace", {"storage", "volumes"}, true,
+                  "Unknown namespace or command 'volumes' in 'storage'. See 'autocli storage --help'."},
+        UsageCase{"unknown_top_level", {"nope"}, true, "Unknown namespace or command 'nope' at the top level. See 'autocli --help'."},
+        UsageCase{"namespace_without_command", {"storage", "volume"}, true,
+                  "'storage volume' is a namespace: name one of its commands. See 'autocli storage volume --help'."},
+        UsageCase{"no_command", {}, true, "No command given. See 'autocli --help'."},
+        UsageCase{"unknown_global", {"--verbose"}, true, "Unknown option '--verbose'. See 'autocli --help'."},
+        UsageCase{"unknown_parameter", {"-n", "x", "--nme", "y"}, false,
+                  "Unknown parameter '--nme' for 'storage volume set'. See 'autocli storage volume set --help'."},
+        UsageCase{"short_names_are_case_sensitive", {"-n", "x", "-F"}, false,
+                  "Unknown parameter '-F' for 'storage volume set'. See 'autocli storage volume set --help'."},
+        UsageCase{"missing_value", {"-n"}, false, "Missing value for parameter '--name'. See 'autocli storage volume set --help'."},
+        UsageCase{"missing_required", {"-f"}, false,
+                  "Missing required parameter '--name' (-n). See 'autocli storage volume set --help'."},
+        UsageCase{"int_junk", {"-n", "x", "-q", "12abc"}, false,
+                  "Invalid value '12abc' for '--depth': expected a 64-bit decimal integer. See 'autocli storage volume set --help'."},
+        UsageCase{"int_beyond_64_bits", {"-n", "x", "--big", "9223372036854775808"}, false,
+                  "Invalid value '9223372036854775808' for '--big': expected a 64-bit decimal integer. See 'autocli storage volume set --help'."},
+        UsageCase{"int_out_of_range", {"-n", "x", "-q", "0"}, false,
+                  "Invalid value '0' for '--depth': must be between 1 and 4294967295. See 'autocli storage volume set --help'."},
+        UsageCase{"enum_is_case_sensitive", {"-n", "x", "-l", "LOW"}, false,
+                  "Invalid value 'LOW' for '--level': must be one of low, high. See 'autocli storage volume set --help'."},
+        UsageCase{"bool_junk", {"-n", "x", "-e", "maybe"}, false,
+                  "Invalid value 'maybe' for '--enabled': expected true or false (also yes/no, 1/0, on/off). See 'autocli storage volume set --help'."},
+        UsageCase{"given_twice", {"-n", "x", "--name=y"}, false,
+                  "Parameter '--name' given more than once. See 'autocli storage volume set --help'."},
+        UsageCase{"flag_with_value", {"-n", "x", "--force=yes"}, false,
+                  "Parameter '--force' is a flag and takes no value. See 'autocli storage volume set --help'."},
+        UsageCase{"stray_argument", {"-n", "x", "extra"}, false,
+                  "Unexpected argument 'extra' after command 'storage volume set'. See 'autocli storage volume set --help'."},
+        UsageCase{"control_characters_escaped", {"-n", "x", "-q", "1\n2"}, false,
+                  "Invalid value '1\\n2' for '--depth': expected a 64-bit decimal integer. See 'autocli storage volume set --help'."},
+        UsageCase{"unknown_formatter", {"--formatter", "xml"}, true,
+                  "Unknown formatter 'xml': use table, simple, json or csv. See 'autocli --help'."},
+        UsageCase{"unknown_field", {"-n", "x", "--format-param", "fields=Nope"}, false,
+                  "Invalid --format-param fields: unknown field 'Nope'; the fields of Volume are: Name, Size, Mounted. See 'autocli storage volume set --help'."},
+        UsageCase{"format_param_without_equals", {"--format-param", "fields"}, true,
+                  "Invalid --format-param 'fields': expected KEY=VALUE. See 'autocli --help'."},
+        UsageCase{"state_after_path", {"-n", "x", "--state", "f"}, false,
+                  "Option '--state' must come before the command path. See 'autocli storage volume set --help'."}),
+    [](const auto& info) { return std::string(info.param.name); });
+
+TEST(Parser, HelpStopsAtThePathGivenSoFar)
+{
+    Tree tree;
+    auto inv = ParseCommandLine(tree.root, {"storage", "volume", "-h", "set"});
+    EXPECT_EQ(inv.action, Invocation::Action::Help);
+    EXPECT_EQ(inv.path, (CommandPath{"storage", "volume"}));
+    // A value that looks like an option is still a value.
+    inv = tree.Parse({"-n", "--help"});
+    ASSERT_EQ(inv.action, Invocation::Action::Run) << inv.error;
+    EXPECT_EQ(inv.input->GetParameter("name"), "--help");
+}
+
+TEST(Parser, Int64Boundaries)
+{
+    EXPECT_EQ(ParseInt64("9223372036854775807"), INT64_MAX);
+    EXPECT_EQ(ParseInt64("+12"), 12);
+    for (const char* bad : {"", "+", "-", "+-1", " 1", "1 ", "0x10", "1e3", "-9223372036854775809"}) {
+        EXPECT_FALSE(ParseInt64(bad)) << bad;
+    }
+}
+
+TEST(Help, CommandHelpShowsParametersExamplesAndFieldsOnce)
+{
+    Tree tree;
+    tree.set->describe = [old = tree.set->describe](InputSpec& spec, FakeCommand& self) {
+        old(spec, self);
+        spec.AddParameter(Param("mode", "m", ParameterType::String, false, Levels()));
+        spec.GetParameters().back()->SetDescription("Mode, one of %ENUM%.");
+    };
+    const auto help = CommandHelp({"storage", "volume", "set"}, *tree.set);
+    const auto again = CommandHelp({"storage", "volume", "set"}, *tree.set);
+    EXPECT_EQ(help, again);
+    EXPECT_EQ(tree.set->GetExamples().size(), 1u);
+    EXPECT_NE(help.find("Mode, one of low, high. (optional)"), std::string::npos) << help;
+    EXPECT_NE(help.find("low: Little"), std::string::npos);
+    EXPECT_NE(help.find("-n|--name <str>"), std::string::npos);
+    EXPECT_NE(help.find("(required)"), std::string::npos);
+    EXPECT_NE(help.find("autocli storage volume set -n vol1\n      Change vol1."), std::string::npos);
+    EXPECT_NE(help.find("Result: a list of Volume"), std::string::npos);
+}
+
+TEST(Help, NamespaceHelpListsChildrenInRegistrationOrder)
+{
+    auto ns = Namespace::New();
+    ns->SetDescription("Things.");
+    auto zeta = Namespace::New();
+    zeta->SetDescription("Last letter.");
+    ns->RegisterNamespaceNode(zeta, "zeta");
+    ns->RegisterNamespaceNode(FakeCommand::New("Run b."), "b");
+    ns->RegisterNamespaceNode(FakeCommand::New("Run a."), "a");
+    EXPECT_EQ(NamespaceHelp({"x"}, *ns),
+              "Usage: autocli [GLOBAL OPTIONS] x {NAMESPACE|COMMAND} ... [PARAMETERS]\n\nThings.\n\n"
+              "Available namespaces:\n  zeta  Last letter.\n\nAvailable commands:\n  b  Run b.\n  a  Run a.\n");
+}
+
+} // namespace
