@@ -208,9 +208,10 @@ public:
         const ParameterSpec* parameter = nullptr;
         std::optional<std::string> inlineValue;
         if (arg.rfind("--", 0) == 0) {
-            auto [name, value] = SplitLong(arg);
+            auto split = SplitLong(arg);
+            const std::string& name = split.first;
             parameter = Find([&](const ParameterSpec& p) { return !p.GetName().empty() && "--" + p.GetName() == name; });
-            inlineValue = std::move(value);
+            inlineValue = std::move(split.second);
         } else {
             parameter = Find([&](const ParameterSpec& p) { return !p.GetShortName().empty() && "-" + p.GetShortName() == arg; });
         }

@@ -1,0 +1,141 @@
+#include "support/Cli.h"
+
+#include <fcntl.h>
+#include <poll.h>
+#include <spawn.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <cstring>
+#include <stdexcept>
+
+#include "framework/Render.h"
+
+extern char** environ;
+
+namespace TestSupport {
+
+namespace {
+
+// The current environment with `extra` "NAME=VALUE" entries added or replacing.
+std::vector<std::string> Environment(const std::vector<std::string>& extra)
+{
+    std::vector<std::string> entries;
+    for (char** entry = environ; *entry != nullptr; ++entry) {
+        const std::string text = *entry;
+        const std::string name = text.substr(0, text.find('='));
+        bool replaced = false;
+        for (const auto& addition : extra) {
+            replaced = replaced || addition.substr(0, addition.find('=')) == name;
+        }
+        if (!replaced) {
+            entries.push_back(text);
+        }
+    }
+    entries.insert(entries.end(), extra.begin(), extra.end());
+    return entries;
+}
+
+std::vector<char*> Pointers(std::vector<std::string>& texts)
+{
+    std::vector<char*> pointers;
+    for (auto& text : texts) {
+        pointers.push_back(text.data());
+    }
+    pointers.push_back(nullptr);
+    return pointers;
+}
+
+} // namespace
+
+CliResult RunAutocli(const std::vector<std::string>& args, const std::string& statePath, const std::vector<std::string>& env)
+{
+    std::vector<std::string> argv{AUTOCLI_BINARY};
+    if (!statePath.empty()) {
+        argv.insert(argv.end(), {"--state", statePath});
+    }
+    argv.insert(argv.end(), args.begin(), args.end());
+    auto envp = Environment(env);
+    auto argvPointers = Pointers(argv);
+    auto envPointers = Pointers(envp);
+
+    int outPipe[2];
+    int errPipe[2];
+    if (::pipe2(outPipe, O_CLOEXEC) != 0 || ::pipe2(errPipe, O_CLOEXEC) != 0) {
+        throw std::runtime_error(std::string("pipe: ") + std::strerror(errno));
+    }
+    posix_spawn_file_actions_t actions;
+    posix_spawn_file_actions_init(&actions);
+    posix_spawn_file_actions_addopen(&actions, STDIN_FILENO, "/dev/null", O_RDONLY, 0);
+    posix_spawn_file_actions_adddup2(&actions, outPipe[1], STDOUT_FILENO);
+    posix_spawn_file_actions_adddup2(&actions, errPipe[1], STDERR_FILENO);
+    pid_t pid = -1;
+    const int spawned = posix_spawn(&pid, argv[0].c_str(), &actions, nullptr, argvPointers.data(), envPointers.data());
+    posix_spawn_file_actions_destroy(&actions);
+    ::close(outPipe[1]);
+    ::close(errPipe[1]);
+    if (spawned != 0) {
+        ::close(outPipe[0]);
+        ::close(errPipe[0]);
+        throw std::runtime_error("cannot start " + argv[0] + ": " + std::strerror(spawned));
+    }
+
+    CliResult result;
+    pollfd fds[2] = {{outPipe[0], POLLIN, 0}, {errPipe[0], POLLIN, 0}};
+    std::string* sinks[2] = {&result.out, &result.err};
+    int open = 2;
+    char buffer[65536];
+    while (open > 0) {
+        if (::poll(fds, 2, -1) < 0) {
+            if (errno == EINTR) {
+                continue;
+            }
+            break;
+        }
+        for (int i = 0; i < 2; ++i) {
+            if (fds[i].fd < 0 || fds[i].revents == 0) {
+                continue;
+            }
+            const ssize_t n = ::read(fds[i].fd, buffer, sizeof buffer);
+            if (n > 0) {
+                sinks[i]->append(buffer, static_cast<std::size_t>(n));
+            } else if (n == 0 || errno != EINTR) {
+                ::close(fds[i].fd);
+                fds[i].fd = -1;
+                --open;
+            }
+        }
+    }
+    for (auto& fd : fds) {
+        if (fd.fd >= 0) {
+            ::close(fd.fd);
+        }
+    }
+    int status = 0;
+    while (::waitpid(pid, &status, 0) < 0 && errno == EINTR) {
+    }
+    result.exitCode = WIFEXITED(status) ? WEXITSTATUS(status) : 128 + WTERMSIG(status);
+    return result;
+}
+
+CommandResult Execute(Quillets::AutoCli::Command& command, const std::shared_ptr<Quillets::CallSpec::Input>& in)
+{
+    auto out = Quillets::CallSpec::Output::New();
+    command.Execute(in, out);
+    return {out->GetErrorMessages(), out->GetRootObject()};
+}
+
+std::string Render(Quillets::AutoCli::Command& command, const std::shared_ptr<Quillets::MetaObj::MetaObject>& root,
+                   const std::string& formatter)
+{
+    if (!formatter.empty() && !Quillets::Cli::ParseFormatter(formatter)) {
+        throw std::invalid_argument("unknown formatter '" + formatter + "'");
+    }
+    const Quillets::Cli::OutputHints hints{command.GetDefaultOutputFormatter(), command.GetDefaultOutputParameters()};
+    Quillets::Cli::OutputOptions options;
+    options.formatter = formatter;
+    return Quillets::Cli::RenderResult(root, command.GetOutputSpec()->GetRootObject(), hints, options);
+}
+
+} // namespace TestSupport
