@@ -1,0 +1,1101 @@
+#include "HostState.h"
+
+#include <cinttypes>
+#include <cstdio>
+#include <functional>
+#include <istream>
+#include <limits>
+#include <ostream>
+#include <sstream>
+#include <unordered_map>
+
+#include <nlohmann/json.hpp>
+
+namespace HostSim::Model {
+
+namespace {
+
+using json = nlohmann::json;
+using ojson = nlohmann::ordered_json;
+
+// Where a value sits in the state, built into text only when a message needs it.
+struct Where {
+    const Where* parent = nullptr;
+    std::string_view key;
+    long index = -1;
+
+    std::string Text() const
+    {
+        std::string text = parent ? parent->Text() : std::string();
+        if (index >= 0) {
+            text += "[" + std::to_string(index) + "]";
+        } else {
+            if (!text.empty())
+                text += ".";
+            text += key;
+        }
+        return text;
+    }
+    Where operator/(std::string_view child) const { return Where{this, child, -1}; }
+    Where operator[](long i) const { return Where{this, {}, i}; }
+};
+
+struct PlaceError {
+    std::string where;
+    std::string what;
+};
+
+[[noreturn]] void Fail(const Where& where, std::string what)
+{
+    throw PlaceError{where.Text(), std::move(what)};
+}
+
+[[noreturn]] void WrongType(const Where& where, const char* expected, const json& value)
+{
+    Fail(where, std::string("expected ") + expected + ", found " + value.type_name());
+}
+
+[[noreturn]] void UnknownKey(const Where& where)
+{
+    Fail(where, "unknown key");
+}
+
+const std::string& Str(const json& v, const Where& w)
+{
+    if (!v.is_string())
+        WrongType(w, "a string", v);
+    return v.get_ref<const std::string&>();
+}
+
+bool Bool(const json& v, const Where& w)
+{
+    if (!v.is_boolean())
+        WrongType(w, "true or false", v);
+    return v.get<bool>();
+}
+
+std::uint64_t Unsigned(const json& v, const Where& w, std::uint64_t max = std::numeric_limits<std::uint64_t>::max())
+{
+    if (!v.is_number_integer())
+        WrongType(w, "an unsigned integer", v);
+    if (!v.is_number_unsigned() || v.get<std::uint64_t>() > max)
+        Fail(w, v.dump() + " is out of range (0 to " + std::to_string(max) + ")");
+    return v.get<std::uint64_t>();
+}
+
+std::int64_t Signed(const json& v, const Where& w, std::int64_t min, std::int64_t max)
+{
+    if (!v.is_number_integer())
+        WrongType(w, "an integer", v);
+    bool inRange = v.is_number_unsigned() ? v.get<std::uint64_t>() <= static_cast<std::uint64_t>(max)
+                                          : (v.get<std::int64_t>() >= min && v.get<std::int64_t>() <= max);
+    if (!inRange)
+        Fail(w, v.dump() + " is out of range (" + std::to_string(min) + " to " + std::to_string(max) + ")");
+    return v.get<std::int64_t>();
+}
+
+std::int32_t Int32(const json& v, const Where& w)
+{
+    return static_cast<std::int32_t>(Signed(v, w, std::numeric_limits<std::int32_t>::min(),
+                                            std::numeric_limits<std::int32_t>::max()));
+}
+
+std::uint32_t Uint32(const json& v, const Where& w)
+{
+    return static_cast<std::uint32_t>(Unsigned(v, w, std::numeric_limits<std::uint32_t>::max()));
+}
+
+std::uint8_t Uint8(const json& v, const Where& w)
+{
+    return static_cast<std::uint8_t>(Unsigned(v, w, 255));
+}
+
+const json& Object(const json& v, const Where& w)
+{
+    if (!v.is_object())
+        WrongType(w, "an object", v);
+    return v;
+}
+
+const json& Array(const json& v, const Where& w)
+{
+    if (!v.is_array())
+        WrongType(w, "an array", v);
+    return v;
+}
+
+std::vector<std::string> Strings(const json& v, const Where& w)
+{
+    std::vector<std::string> result;
+    long i = 0;
+    for (const auto& item : Array(v, w))
+        result.push_back(Str(item, w[i++]));
+    return result;
+}
+
+// Calls `field(key, value, where)` for every key of the object at `w`.
+template <typename F>
+void EachKey(const json& v, const Where& w, F&& field)
+{
+    for (const auto& [key, value] : Object(v, w).items())
+        field(key, value, w / key);
+}
+
+std::string CanonicalMac(const json& v, const Where& w)
+{
+    const std::string& text = Str(v, w);
+    unsigned bytes[6];
+    char tail;
+    if (text.size() != 17 ||
+        std::sscanf(text.c_str(), "%2x:%2x:%2x:%2x:%2x:%2x%c", &bytes[0], &bytes[1], &bytes[2], &bytes[3],
+                    &bytes[4], &bytes[5], &tail) != 6)
+        Fail(w, "expected a MAC address like 00:1e:67:c4:d2:a8, found '" + text + "'");
+    char out[18];
+    std::snprintf(out, sizeof out, "%02x:%02x:%02x:%02x:%02x:%02x", bytes[0], bytes[1], bytes[2], bytes[3],
+                  bytes[4], bytes[5]);
+    return out;
+}
+
+// ---- file systems -------------------------------------------------------------------------
+
+using Record = FileSystemRecord;
+
+struct FsField {
+    const char* key;
+    FsKey bit;
+    void (*read)(Record&, const json&, const Where&);
+    ojson (*write)(const Record&);
+};
+
+ojson WriteExtents(const std::vector<Extent>& extents)
+{
+    ojson list = ojson::array();
+    for (const auto& e : extents)
+        list.push_back({{"deviceName", e.deviceName}, {"partition", e.partition}});
+    return list;
+}
+
+const FsField kFsFields[] = {
+    {"type", FsKey::type, [](Record& r, const json& v, const Where& w) { r.type = Str(v, w); },
+     [](const Record& r) -> ojson { return r.type; }},
+    {"volumeName", FsKey::volumeName, [](Record& r, const json& v, const Where& w) { r.volumeName = Str(v, w); },
+     [](const Record& r) -> ojson { return r.volumeName; }},
+    {"name", FsKey::name, [](Record& r, const json& v, const Where& w) { r.name = Str(v, w); },
+     [](const Record& r) -> ojson { return r.name; }},
+    {"uuid", FsKey::uuid, [](Record& r, const json& v, const Where& w) { r.uuid = Str(v, w); },
+     [](const Record& r) -> ojson { return r.uuid; }},
+    {"mountPoint", FsKey::mountPoint, [](Record& r, const json& v, const Where& w) { r.mountPoint = Str(v, w); },
+     [](const Record& r) -> ojson { return r.mountPoint; }},
+    {"mounted", FsKey::mounted, [](Record& r, const json& v, const Where& w) { r.mounted = Bool(v, w); },
+     [](const Record& r) -> ojson { return r.mounted; }},
+    {"accessible", FsKey::accessible, [](Record& r, const json& v, const Where& w) { r.accessible = Bool(v, w); },
+     [](const Record& r) -> ojson { return r.accessible; }},
+    {"capacity", FsKey::capacity, [](Record& r, const json& v, const Where& w) { r.capacity = Unsigned(v, w); },
+     [](const Record& r) -> ojson { return r.capacity; }},
+    {"used", FsKey::used, [](Record& r, const json& v, const Where& w) { r.used = Unsigned(v, w); },
+     [](const Record& r) -> ojson { return r.used; }},
+    {"qaxiState", FsKey::qaxiState, [](Record& r, const json& v, const Where& w) { r.qaxiState = Int32(v, w); },
+     [](const Record& r) -> ojson { return r.qaxiState; }},
+    {"busy", FsKey::busy, [](Record& r, const json& v, const Where& w) { r.busy = Bool(v, w); },
+     [](const Record& r) -> ojson { return r.busy; }},
+    {"explicitlyUnmounted", FsKey::explicitlyUnmounted,
+     [](Record& r, const json& v, const Where& w) { r.explicitlyUnmounted = Bool(v, w); },
+     [](const Record& r) -> ojson { return r.explicitlyUnmounted; }},
+    {"majorVersion", FsKey::majorVersion,
+     [](Record& r, const json& v, const Where& w) { r.MutableHlfs().majorVersion = Int32(v, w); },
+     [](const Record& r) -> ojson { return r.Hlfs().majorVersion; }},
+    {"lvmUuid", FsKey::lvmUuid, [](Record& r, const json& v, const Where& w) { r.MutableHlfs().lvmUuid = Str(v, w); },
+     [](const Record& r) -> ojson { return r.Hlfs().lvmUuid; }},
+    {"lockMode", FsKey::lockMode,
+     [](Record& r, const json& v, const Where& w) { r.MutableHlfs().lockMode = Uint32(v, w); },
+     [](const Record& r) -> ojson { return r.Hlfs().lockMode; }},
+    {"atsSupport", FsKey::atsSupport,
+     [](Record& r, const json& v, const Where& w) { r.MutableHlfs().atsSupport = Int32(v, w); },
+     [](const Record& r) -> ojson { return r.Hlfs().atsSupport; }},
+    {"extents", FsKey::extents,
+     [](Record& r, const json& v, const Where& w) {
+         auto& extents = r.MutableHlfs().extents;
+         long i = 0;
+         for (const auto& item : Array(v, w)) {
+             Extent e;
+             EachKey(item, w[i++], [&](const std::string& key, const json& value, const Where& at) {
+                 if (key == "deviceName")
+                     e.deviceName = Str(value, at);
+                 else if (key == "partition")
+                     e.partition = Uint8(value, at);
+                 else
+                     UnknownKey(at);
+             });
+             extents.push_back(std::move(e));
+         }
+     },
+     [](const Record& r) -> ojson { return WriteExtents(r.Hlfs().extents); }},
+    {"users", FsKey::users,
+     [](Record& r, const json& v, const Where& w) {
+         auto& users = r.MutableHlfs().users;
+         long i = 0;
+         for (const auto& item : Array(v, w)) {
+             User u;
+             EachKey(item, w[i++], [&](const std::string& key, const json& value, const Where& at) {
+                 if (key == "heartbeatUuid")
+                     u.heartbeatUuid = Str(value, at);
+                 else if (key == "macAddress")
+                     u.macAddress = CanonicalMac(value, at);
+                 else if (key == "driverVersionMajor")
+                     u.driverVersionMajor = Uint32(value, at);
+                 else if (key == "driverVersionMinor")
+                     u.driverVersionMinor = Uint32(value, at);
+                 else if (key == "heartbeatOffset")
+                     u.heartbeatOffset = Signed(value, at, std::numeric_limits<std::int64_t>::min(),
+                                                std::numeric_limits<std::int64_t>::max());
+                 else if (key == "lockModeInUse")
+                     u.lockModeInUse = Uint8(value, at);
+                 else if (key == "live")
+                     u.live = Bool(value, at);
+                 else
+                     UnknownKey(at);
+             });
+             users.push_back(std::move(u));
+         }
+     },
+     [](const Record& r) -> ojson {
+         ojson list = ojson::array();
+         for (const auto& u : r.Hlfs().users)
+             list.push_back({{"heartbeatUuid", u.heartbeatUuid},
+                             {"macAddress", u.macAddress},
+                             {"driverVersionMajor", u.driverVersionMajor},
+                             {"driverVersionMinor", u.driverVersionMinor},
+                             {"heartbeatOffset", u.heartbeatOffset},
+                             {"lockModeInUse", u.lockModeInUse},
+                             {"live", u.live}});
+         return list;
+     }},
+    {"unmapProperty", FsKey::unmapProperty,
+     [](Record& r, const json& v, const Where& w) {
+         auto& p = r.MutableHlfs().unmapProperty;
+         EachKey(v, w, [&](const std::string& key, const json& value, const Where& at) {
+             if (key == "granularity")
+                 p.granularity = Uint32(value, at);
+             else if (key == "priority")
+                 p.priority = Str(value, at);
+             else if (key == "bandwidth")
+                 p.bandwidth = Int32(value, at);
+             else if (key == "reserved")
+                 p.reserved = Int32(value, at);
+             else if (key == "method")
+                 p.method = Str(value, at);
+             else
+                 UnknownKey(at);
+         });
+     },
+     [](const Record& r) -> ojson {
+         const auto& p = r.Hlfs().unmapProperty;
+         return {{"granularity", p.granularity},
+                 {"priority", p.priority},
+                 {"bandwidth", p.bandwidth},
+                 {"reserved", p.reserved},
+                 {"method", p.method}};
+     }},
+    {"clusteredHdskEnabled", FsKey::clusteredHdskEnabled,
+     [](Record& r, const json& v, const Where& w) { r.MutableHlfs().clusteredHdskEnabled = Bool(v, w); },
+     [](const Record& r) -> ojson { return r.Hlfs().clusteredHdskEnabled; }},
+    {"remoteHost", FsKey::remoteHost,
+     [](Record& r, const json& v, const Where& w) { r.MutableNfs().remoteHost = Str(v, w); },
+     [](const Record& r) -> ojson { return r.Nfs().remoteHost; }},
+    {"remoteHosts", FsKey::remoteHosts,
+     [](Record& r, const json& v, const Where& w) { r.MutableNfs().remoteHosts = Strings(v, w); },
+     [](const Record& r) -> ojson { return r.Nfs().remoteHosts; }},
+    {"remoteShare", FsKey::remoteShare,
+     [](Record& r, const json& v, const Where& w) { r.MutableNfs().remoteShare = Str(v, w); },
+     [](const Record& r) -> ojson { return r.Nfs().remoteShare; }},
+    {"readOnly", FsKey::readOnly, [](Record& r, const json& v, const Where& w) { r.MutableNfs().readOnly = Bool(v, w); },
+     [](const Record& r) -> ojson { return r.Nfs().readOnly; }},
+    {"readOnlyState", FsKey::readOnlyState,
+     [](Record& r, const json& v, const Where& w) { r.MutableNfs().readOnlyState = Bool(v, w); },
+     [](const Record& r) -> ojson { return r.Nfs().readOnlyState; }},
+    {"isPE", FsKey::isPE, [](Record& r, const json& v, const Where& w) { r.MutableNfs().isPE = Bool(v, w); },
+     [](const Record& r) -> ojson { return r.Nfs().isPE; }},
+    {"hidden", FsKey::hidden, [](Record& r, const json& v, const Where& w) { r.MutableNfs().hidden = Bool(v, w); },
+     [](const Record& r) -> ojson { return r.Nfs().hidden; }},
+    {"knxnic", FsKey::knxnic, [](Record& r, const json& v, const Where& w) { r.MutableNfs().knxnic = Str(v, w); },
+     [](const Record& r) -> ojson { return r.Nfs().knxnic; }},
+    {"knxnics", FsKey::knxnics, [](Record& r, const json& v, const Where& w) { r.MutableNfs().knxnics = Str(v, w); },
+     [](const Record& r) -> ojson { return r.Nfs().knxnics; }},
+    {"connections", FsKey::connections,
+     [](Record& r, const json& v, const Where& w) {
+         r.MutableNfs().connections = Signed(v, w, std::numeric_limits<std::int64_t>::min(),
+                                             std::numeric_limits<std::int64_t>::max());
+     },
+     [](const Record& r) -> ojson { return r.Nfs().connections; }},
+    {"connectionsParam", FsKey::connectionsParam,
+     [](Record& r, const json& v, const Where& w) { r.MutableNfs().connectionsParam = Int32(v, w); },
+     [](const Record& r) -> ojson { return r.Nfs().connectionsParam; }},
+    {"maxQueueDepth", FsKey::maxQueueDepth,
+     [](Record& r, const json& v, const Where& w) { r.MutableNfs().maxQueueDepth = Uint32(v, w); },
+     [](const Record& r) -> ojson { return r.Nfs().maxQueueDepth; }},
+    {"maxReadTransferSize", FsKey::maxReadTransferSize,
+     [](Record& r, const json& v, const Where& w) { r.MutableNfs().maxReadTransferSize = Uint32(v, w); },
+     [](const Record& r) -> ojson { return r.Nfs().maxReadTransferSize; }},
+    {"maxWriteTransferSize", FsKey::maxWriteTransferSize,
+     [](Record& r, const json& v, const Where& w) { r.MutableNfs().maxWriteTransferSize = Uint32(v, w); },
+     [](const Record& r) -> ojson { return r.Nfs().maxWriteTransferSize; }},
+    {"securityType", FsKey::securityType,
+     [](Record& r, const json& v, const Where& w) { r.MutableNfs().securityType = Int32(v, w); },
+     [](const Record& r) -> ojson { return r.Nfs().securityType; }},
+    {"preUnmount", FsKey::preUnmount, [](Record& r, const json& v, const Where& w) { r.preUnmount = Bool(v, w); },
+     [](const Record& r) -> ojson { return r.preUnmount; }},
+};
+
+static_assert(std::size(kFsFields) == static_cast<std::size_t>(FsKey::count));
+
+const FsField* FindFsField(std::string_view key)
+{
+    static const auto index = [] {
+        std::unordered_map<std::string_view, const FsField*> map;
+        for (const auto& field : kFsFields)
+            map.emplace(field.key, &field);
+        return map;
+    }();
+    auto it = index.find(key);
+    return it == index.end() ? nullptr : it->second;
+}
+
+Record ReadFileSystem(const json& v, const Where& w)
+{
+    Record r;
+    EachKey(v, w, [&](const std::string& key, const json& value, const Where& at) {
+        const FsField* field = FindFsField(key);
+        if (!field)
+            UnknownKey(at);
+        field->read(r, value, at);
+        r.Mark(field->bit);
+    });
+    for (FsKey required : {FsKey::type, FsKey::volumeName})
+        if (!r.Has(required))
+            Fail(w, std::string("missing required key '") + kFsFields[static_cast<int>(required)].key + "'");
+    r.kind = KindOfType(r.type);
+    ResolveDefaults(r);
+    return r;
+}
+
+ojson WriteFileSystem(const Record& r)
+{
+    ojson out = ojson::object();
+    for (const auto& field : kFsFields)
+        if (r.Has(field.bit))
+            out[field.key] = field.write(r);
+    return out;
+}
+
+// ---- unresolved volumes -------------------------------------------------------------------
+
+UnresolvedVolume ReadUnresolved(const json& v, const Where& w)
+{
+    UnresolvedVolume u;
+    if (v.is_null()) {
+        u.null = true;
+        return u;
+    }
+    if (!v.is_object())
+        WrongType(w, "an object or null", v);
+    EachKey(v, w, [&](const std::string& key, const json& value, const Where& at) {
+        if (key == "volumeName") {
+            u.volumeName = Str(value, at);
+        } else if (key == "uuid") {
+            u.uuid = Str(value, at);
+            u.uuidGiven = true;
+        } else if (key == "lvmUuid") {
+            u.lvmUuid = Str(value, at);
+        } else if (key == "majorVersion") {
+            u.majorVersion = Int32(value, at);
+        } else if (key == "capacity") {
+            u.capacity = Unsigned(value, at);
+        } else if (key == "mountReason") {
+            u.mountReason = Uint32(value, at);
+        } else if (key == "resignatureReason") {
+            u.resignatureReason = Uint32(value, at);
+        } else if (key == "impl") {
+            u.impl = Bool(value, at);
+        } else if (key == "extents") {
+            long i = 0;
+            for (const auto& item : Array(value, at)) {
+                Where itemAt = at[i++];
+                UnresolvedExtent e;
+                if (item.is_null()) {
+                    e.null = true;
+                } else {
+                    if (!item.is_object())
+                        WrongType(itemAt, "an object or null", item);
+                    EachKey(item, itemAt, [&](const std::string& k, const json& x, const Where& xAt) {
+                        if (k == "deviceName")
+                            e.deviceName = Str(x, xAt);
+                        else if (k == "partition")
+                            e.partition = Uint8(x, xAt);
+                        else if (k == "start")
+                            e.start = Signed(x, xAt, std::numeric_limits<std::int64_t>::min(),
+                                             std::numeric_limits<std::int64_t>::max());
+                        else if (k == "end")
+                            e.end = Signed(x, xAt, std::numeric_limits<std::int64_t>::min(),
+                                           std::numeric_limits<std::int64_t>::max());
+                        else if (k == "impl")
+                            e.impl = Bool(x, xAt);
+                        else
+                            UnknownKey(xAt);
+                    });
+                }
+                u.extents.push_back(std::move(e));
+            }
+        } else {
+            UnknownKey(at);
+        }
+    });
+    ResolveDefaults(u);
+    return u;
+}
+
+ojson WriteUnresolved(const UnresolvedVolume& u)
+{
+    if (u.null)
+        return nullptr;
+    ojson out = ojson::object();
+    out["volumeName"] = u.volumeName;
+    if (u.uuidGiven)
+        out["uuid"] = u.uuid;
+    if (!u.lvmUuid.empty())
+        out["lvmUuid"] = u.lvmUuid;
+    out["majorVersion"] = u.majorVersion;
+    out["capacity"] = u.capacity;
+    out["mountReason"] = u.mountReason;
+    out["resignatureReason"] = u.resignatureReason;
+    ojson extents = ojson::array();
+    for (const auto& e : u.extents) {
+        if (e.null) {
+            extents.push_back(nullptr);
+            continue;
+        }
+        ojson x = {{"deviceName", e.deviceName}, {"partition", e.partition}, {"start", e.start}, {"end", e.end}};
+        if (!e.impl)
+            x["impl"] = false;
+        extents.push_back(std::move(x));
+    }
+    out["extents"] = std::move(extents);
+    if (!u.impl)
+        out["impl"] = false;
+    return out;
+}
+
+// ---- the other top-level keys -------------------------------------------------------------
+
+void ReadFeatures(State& st, const json& v, const Where& w)
+{
+    EachKey(v, w, [&](const std::string& key, const json& value, const Where& at) {
+        for (int i = 0; i < 4; ++i) {
+            if (key == kFeatureKeys[i]) {
+                st.features[i] = Bool(value, at);
+                return;
+            }
+        }
+        UnknownKey(at);
+    });
+}
+
+void ReadAdvancedOptions(State& st, const json& v, const Where& w)
+{
+    EachKey(v, w, [&](const std::string& group, const json& options, const Where& groupAt) {
+        OptionGroup entries;
+        EachKey(options, groupAt, [&](const std::string& name, const json& value, const Where& at) {
+            if (value.is_string())
+                entries.emplace_back(name, value.get<std::string>());
+            else if (value.is_number_integer())
+                entries.emplace_back(name, Signed(value, at, std::numeric_limits<std::int64_t>::min(),
+                                                  std::numeric_limits<std::int64_t>::max()));
+            else
+                WrongType(at, "an integer or a string", value);
+        });
+        st.advancedOptions.emplace_back(group, std::move(entries));
+    });
+}
+
+void ReadPendingRescan(State& st, const json& v, const Where& w)
+{
+    EachKey(v, w, [&](const std::string& key, const json& value, const Where& at) {
+        long i = 0;
+        if (key == "fileSystems") {
+            st.pendingHasFileSystems = true;
+            for (const auto& item : Array(value, at))
+                st.pendingFileSystems.push_back(ReadFileSystem(item, at[i++]));
+        } else if (key == "unresolvedVolumes") {
+            st.pendingHasUnresolved = true;
+            for (const auto& item : Array(value, at))
+                st.pendingUnresolved.push_back(ReadUnresolved(item, at[i++]));
+        } else {
+            UnknownKey(at);
+        }
+    });
+}
+
+void ReadTopKey(State& st, const std::string& key, const json& value, const Where& at)
+{
+    long i = 0;
+    if (key == "features") {
+        ReadFeatures(st, value, at);
+        st.Mark(TopKey::features);
+    } else if (key == "advancedOptions") {
+        ReadAdvancedOptions(st, value, at);
+        st.Mark(TopKey::advancedOptions);
+    } else if (key == "behaviour") {
+        EachKey(value, at, [&](const std::string& k, const json& x, const Where& xAt) {
+            if (k != "tryMount")
+                UnknownKey(xAt);
+            st.tryMount = Bool(x, xAt);
+        });
+        st.Mark(TopKey::behaviour);
+    } else if (key == "fileSystems") {
+        // Elements are normally converted while the text streams in; this handles the rest.
+        for (const auto& item : Array(value, at)) {
+            st.fileSystems.push_back(ReadFileSystem(item, at[i++]));
+            st.fileSystems.back().id = st.nextFileSystemId++;
+        }
+        st.Mark(TopKey::fileSystems);
+    } else if (key == "pendingRescan") {
+        ReadPendingRescan(st, value, at);
+        st.Mark(TopKey::pendingRescan);
+    } else if (key == "unresolvedVolumes") {
+        for (const auto& item : Array(value, at)) {
+            st.unresolvedVolumes.push_back(ReadUnresolved(item, at[i++]));
+            st.unresolvedVolumes.back().id = st.nextUnresolvedId++;
+        }
+        st.Mark(TopKey::unresolvedVolumes);
+    } else if (key == "nfsExports") {
+        for (const auto& item : Array(value, at)) {
+            NfsExport e;
+            EachKey(item, at[i++], [&](const std::string& k, const json& x, const Where& xAt) {
+                if (k == "host")
+                    e.host = Str(x, xAt);
+                else if (k == "share")
+                    e.share = Str(x, xAt);
+                else if (k == "capacity")
+                    e.capacity = Unsigned(x, xAt);
+                else if (k == "used")
+                    e.used = Unsigned(x, xAt);
+                else
+                    UnknownKey(xAt);
+            });
+            st.nfsExports.push_back(std::move(e));
+        }
+        st.Mark(TopKey::nfsExports);
+    } else if (key == "firewall") {
+        EachKey(value, at, [&](const std::string& k, const json& x, const Where& xAt) {
+            if (k == "nfsClient")
+                st.nfsClient = Strings(x, xAt);
+            else if (k == "nfs41Client")
+                st.nfs41Client = Strings(x, xAt);
+            else
+                UnknownKey(xAt);
+        });
+        st.Mark(TopKey::firewall);
+    } else if (key == "heaps") {
+        for (const auto& item : Array(value, at)) {
+            Heap h;
+            EachKey(item, at[i++], [&](const std::string& k, const json& x, const Where& xAt) {
+                if (k == "name")
+                    h.name = Str(x, xAt);
+                else if (k == "size")
+                    h.size = Unsigned(x, xAt);
+                else if (k == "maxSize")
+                    h.maxSize = Unsigned(x, xAt);
+                else
+                    UnknownKey(xAt);
+            });
+            st.heaps.push_back(std::move(h));
+        }
+        st.Mark(TopKey::heaps);
+    } else if (key == "pointerBlockCache") {
+        auto& c = st.pointerBlockCache;
+        EachKey(value, at, [&](const std::string& k, const json& x, const Where& xAt) {
+            if (k == "cacheSize")
+                c.cacheSize = Unsigned(x, xAt);
+            else if (k == "cacheSizeMax")
+                c.cacheSizeMax = Unsigned(x, xAt);
+            else if (k == "workingSet")
+                c.workingSet = Unsigned(x, xAt);
+            else if (k == "workingSetMax")
+                c.workingSetMax = Unsigned(x, xAt);
+            else if (k == "heapOverhead")
+                c.heapOverhead = Unsigned(x, xAt);
+            else if (k == "capacityMissRatio")
+                c.capacityMissRatio = Int32(x, xAt);
+            else
+                UnknownKey(xAt);
+        });
+        st.Mark(TopKey::pointerBlockCache);
+    } else if (key == "faults") {
+        for (const auto& item : Array(value, at)) {
+            Where itemAt = at[i++];
+            Fault f;
+            bool hasCall = false;
+            EachKey(item, itemAt, [&](const std::string& k, const json& x, const Where& xAt) {
+                if (k == "call") {
+                    f.call = Str(x, xAt);
+                    hasCall = true;
+                } else if (k == "target") {
+                    f.target = Str(x, xAt);
+                } else if (k == "message") {
+                    f.message = Str(x, xAt);
+                } else if (k == "skip") {
+                    f.skip = Unsigned(x, xAt);
+                } else if (k == "times") {
+                    f.times = Unsigned(x, xAt);
+                } else {
+                    UnknownKey(xAt);
+                }
+            });
+            if (!hasCall)
+                Fail(itemAt, "missing required key 'call'");
+            if (!item.contains("message"))
+                f.message = "Injected failure of " + f.call;
+            st.faults.push_back(std::move(f));
+        }
+        st.Mark(TopKey::faults);
+    } else {
+        UnknownKey(at);
+    }
+}
+
+// Builds the document like a DOM parser, except that each element of the top-level
+// "fileSystems" array is converted to a record as soon as it is complete and then dropped,
+// so a large host never exists twice in memory.
+class StreamingReader {
+public:
+    explicit StreamingReader(State& state) : state_(state) {}
+
+    json root;
+
+    bool null() { return Scalar(nullptr); }
+    bool boolean(bool v) { return Scalar(v); }
+    bool number_integer(json::number_integer_t v) { return Scalar(v); }
+    bool number_unsigned(json::number_unsigned_t v) { return Scalar(v); }
+    bool number_float(json::number_float_t v, const json::string_t&) { return Scalar(v); }
+    bool string(json::string_t& v) { return Scalar(std::move(v)); }
+    bool binary(json::binary_t&) { return true; }
+
+    bool start_object(std::size_t)
+    {
+        stack_.push_back(Place(json::value_t::object));
+        return true;
+    }
+    bool key(json::string_t& k)
+    {
+        if (stack_.size() == 1)
+            topKey_ = k;
+        slot_ = &(*stack_.back())[k];
+        return true;
+    }
+    bool end_object()
+    {
+        stack_.pop_back();
+        Completed();
+        return true;
+    }
+    bool start_array(std::size_t)
+    {
+        json* array = Place(json::value_t::array);
+        stack_.push_back(array);
+        if (stack_.size() == 2 && stack_[0]->is_object() && topKey_ == "fileSystems") {
+            streamed_ = array;
+            streamedCount_ = 0;
+            state_.fileSystems.clear(); // a repeated key: the last one counts
+        }
+        return true;
+    }
+    bool end_array()
+    {
+        stack_.pop_back();
+        Completed();
+        return true;
+    }
+    bool parse_error(std::size_t, const std::string&, const nlohmann::detail::exception& ex)
+    {
+        std::string text = ex.what();
+        if (auto close = text.find("] "); text.rfind("[json.exception", 0) == 0 && close != std::string::npos)
+            text.erase(0, close + 2);
+        throw PlaceError{"", text};
+    }
+
+    bool StreamedFileSystems() const { return streamed_ != nullptr; }
+
+private:
+    template <typename V>
+    bool Scalar(V&& v)
+    {
+        Place(json(std::forward<V>(v)));
+        Completed();
+        return true;
+    }
+
+    json* Place(json v)
+    {
+        if (stack_.empty()) {
+            root = std::move(v);
+            return &root;
+        }
+        if (stack_.back()->is_array()) {
+            stack_.back()->push_back(std::move(v));
+            return &stack_.back()->back();
+        }
+        *slot_ = std::move(v);
+        return slot_;
+    }
+
+    void Completed()
+    {
+        if (!streamed_ || stack_.size() != 2 || stack_.back() != streamed_)
+            return;
+        const Where top{nullptr, "fileSystems", -1};
+        state_.fileSystems.push_back(ReadFileSystem(streamed_->back(), top[streamedCount_++]));
+        state_.fileSystems.back().id = state_.nextFileSystemId++;
+        streamed_->erase(streamed_->end() - 1);
+    }
+
+    State& state_;
+    std::vector<json*> stack_;
+    json* slot_ = nullptr;
+    std::string topKey_;
+    json* streamed_ = nullptr;
+    long streamedCount_ = 0;
+};
+
+void WriteReindented(std::ostream& out, const ojson& value, const char* indent)
+{
+    const std::string text = value.dump(2, ' ', false, ojson::error_handler_t::replace);
+    std::size_t start = 0;
+    for (std::size_t nl = text.find('\n'); nl != std::string::npos; nl = text.find('\n', start)) {
+        out.write(text.data() + start, static_cast<std::streamsize>(nl + 1 - start));
+        out << indent;
+        start = nl + 1;
+    }
+    out.write(text.data() + start, static_cast<std::streamsize>(text.size() - start));
+}
+
+template <typename T, typename F>
+ojson ListOf(const std::vector<T>& items, F&& convert)
+{
+    ojson list = ojson::array();
+    for (const auto& item : items)
+        list.push_back(convert(item));
+    return list;
+}
+
+const char* const kDemoHost = R"({
+  "features": {"102": true, "103": true, "104": true, "270": true},
+  "advancedOptions": {
+    "HLFS3": {"EnableOnlineATSUpgrade": 1, "MaxHeapSizeMB": 256},
+    "NFS": {"MaxVolumes": 8, "HeartbeatFrequency": 12},
+    "Misc": {"HostName": "host01.lab.example"}
+  },
+  "fileSystems": [
+    {
+      "type": "HLFS", "volumeName": "datastore1",
+      "uuid": "5f8d2a31-6c1e47b2-9a0f-001e67c4d2a8", "lvmUuid": "5f8d2a30-1b7c3d44-e2c1-001e67c4d2a8",
+      "capacity": 536602476544, "used": 193273528320, "qaxiState": 1,
+      "majorVersion": 6, "lockMode": 16, "atsSupport": 1,
+      "extents": [{"deviceName": "naa.600508b1001c7e4d2f9a8b3c6d5e4f10", "partition": 3}],
+      "users": [
+        {"heartbeatUuid": "5f8d2a35-0a4c8e21-77d3-001e67c4d2a8", "macAddress": "00:1e:67:c4:d2:a8",
+         "driverVersionMajor": 6, "driverVersionMinor": 82, "heartbeatOffset": 3145728, "lockModeInUse": 1},
+        {"heartbeatUuid": "5f8d2b11-4e9a0c37-1b62-001e67c4d310", "macAddress": "00:1e:67:c4:d3:10",
+         "driverVersionMajor": 6, "driverVersionMinor": 82, "heartbeatOffset": 3149824, "lockModeInUse": 1}
+      ]
+    },
+    {
+      "type": "HLFS", "volumeName": "shared-ds01",
+      "uuid": "5f8d2b02-91a0c3e5-4d21-001e67c4d2a8", "lvmUuid": "5f8d2b01-7ac4e0d9-3f18-001e67c4d2a8",
+      "capacity": 2198754820096, "used": 1319413953331, "qaxiState": 1,
+      "majorVersion": 5, "lockMode": 0, "atsSupport": 1,
+      "extents": [
+        {"deviceName": "naa.60060160a62031002f7c8e4b9d1a5e21", "partition": 1},
+        {"deviceName": "naa.60060160a62031003a8d9f5c0e2b6f32", "partition": 1}
+      ],
+      "users": [
+        {"heartbeatUuid": "5f8d2b05-2c7e9a14-58b0-001e67c4d2a8", "macAddress": "00:1e:67:c4:d2:a8",
+         "driverVersionMajor": 5, "driverVersionMinor": 61, "heartbeatOffset": 3407872, "lockModeInUse": 0}
+      ],
+      "unmapProperty": {"granularity": 1048576, "priority": "none", "bandwidth": 0, "reserved": 0, "method": "priority"}
+    },
+    {
+      "type": "HLFS", "volumeName": "legacy-ds03",
+      "uuid": "4e1c7a90-2d3b5f68-8c17-001e67c4d2a8", "lvmUuid": "4e1c7a8f-93e0b2d6-0a45-001e67c4d2a8",
+      "capacity": 268435456000, "used": 107374182400, "qaxiState": 2,
+      "majorVersion": 3, "lockMode": 0, "atsSupport": 1,
+      "extents": [{"deviceName": "naa.600508b1001c5a3b4c2d1e0f9a8b7c61", "partition": 1}]
+    },
+    {
+      "type": "NFS", "volumeName": "nfs-iso", "uuid": "b7e21c4f-09d3a6e8",
+      "remoteHost": "10.20.30.40", "remoteShare": "/exports/iso",
+      "capacity": 1099511627776, "used": 412316860416, "readOnly": true,
+      "knxnic": "", "knxnics": "", "connections": 1, "maxQueueDepth": 64
+    },
+    {
+      "type": "NFS41", "volumeName": "nfs41-vms", "uuid": "c4a9d0e2-5b8f1736",
+      "remoteHosts": ["10.20.30.41", "10.20.30.42"], "remoteShare": "/exports/vms",
+      "capacity": 4398046511104, "used": 1649267441664, "securityType": 1
+    },
+    {
+      "type": "vfat", "volumeName": "BOOTBANK1", "uuid": "6a3f1e2d-8b4c5a69-0d7e-001e67c4d2a8",
+      "capacity": 4293591040, "used": 1438646272
+    }
+  ],
+  "unresolvedVolumes": [
+    {
+      "volumeName": "datastore1", "uuid": "5f8d2a31-6c1e47b2-9a0f-001e67c4d2a8",
+      "lvmUuid": "5f8d2a30-1b7c3d44-e2c1-001e67c4d2a8", "majorVersion": 6, "capacity": 536602476544,
+      "mountReason": 6, "resignatureReason": 0,
+      "extents": [{"deviceName": "naa.60060160a620310045b9e1d7f3c8a054", "partition": 3, "start": 0, "end": 511743}]
+    }
+  ],
+  "nfsExports": [
+    {"host": "10.20.30.40", "share": "/exports/iso", "capacity": 1099511627776, "used": 412316860416},
+    {"host": "10.20.30.41", "share": "/exports/vms", "capacity": 4398046511104, "used": 1649267441664},
+    {"host": "10.20.30.42", "share": "/exports/vms", "capacity": 4398046511104, "used": 1649267441664},
+    {"host": "10.20.30.40", "share": "/exports/backup", "capacity": 2199023255552, "used": 329853488332}
+  ],
+  "firewall": {
+    "nfsClient": ["10.20.30.0/24", "fd00:20:30::/64"],
+    "nfs41Client": ["10.20.30.41", "10.20.30.42"]
+  },
+  "heaps": [
+    {"name": "hlfs3", "size": 22020096, "maxSize": 268435456},
+    {"name": "nfsclient", "size": 4194304, "maxSize": 33554432}
+  ],
+  "pointerBlockCache": {
+    "cacheSize": 134217728, "cacheSizeMax": 268435456, "workingSet": 35184372088832,
+    "workingSetMax": 43980465111040, "heapOverhead": 4194304, "capacityMissRatio": 3
+  }
+})";
+
+} // namespace
+
+FsKind KindOfType(std::string_view type)
+{
+    if (type == "HLFS")
+        return FsKind::Hlfs;
+    if (type == "NFS")
+        return FsKind::Nfs;
+    if (type == "NFS41")
+        return FsKind::Nfs41;
+    return FsKind::Plain;
+}
+
+const HlfsFields& FileSystemRecord::Hlfs() const
+{
+    static const HlfsFields defaults;
+    return hlfs ? *hlfs : defaults;
+}
+
+HlfsFields& FileSystemRecord::MutableHlfs()
+{
+    if (!hlfs)
+        hlfs = std::make_unique<HlfsFields>();
+    return *hlfs;
+}
+
+const NfsFields& FileSystemRecord::Nfs() const
+{
+    static const NfsFields defaults;
+    return nfs ? *nfs : defaults;
+}
+
+NfsFields& FileSystemRecord::MutableNfs()
+{
+    if (!nfs)
+        nfs = std::make_unique<NfsFields>();
+    return *nfs;
+}
+
+void ResolveDefaults(FileSystemRecord& fs)
+{
+    if (!fs.Has(FsKey::name))
+        fs.name = fs.volumeName;
+    if (!fs.Has(FsKey::uuid))
+        fs.uuid = UuidFromText(fs.volumeName);
+    if (!fs.Has(FsKey::mountPoint))
+        fs.mountPoint = "/hlfs/volumes/" + fs.uuid;
+    if (fs.kind == FsKind::Nfs || fs.kind == FsKind::Nfs41 || fs.nfs) {
+        auto& nfs = fs.MutableNfs();
+        if (!fs.Has(FsKey::readOnlyState))
+            nfs.readOnlyState = nfs.readOnly;
+        if (!fs.Has(FsKey::connectionsParam))
+            nfs.connectionsParam = static_cast<std::int32_t>(nfs.connections);
+        if (!fs.Has(FsKey::securityType))
+            nfs.securityType = fs.kind == FsKind::Nfs41 ? 1 : 0;
+    }
+}
+
+void ResolveDefaults(UnresolvedVolume& volume)
+{
+    if (!volume.uuidGiven)
+        volume.uuid = UuidFromText(volume.volumeName);
+}
+
+std::string UuidFromText(std::string_view text)
+{
+    auto fnv = [&](std::uint64_t hash) {
+        for (unsigned char c : text) {
+            hash ^= c;
+            hash *= 0x100000001b3ull;
+        }
+        // Final mix so that similar names give unrelated UUIDs.
+        hash ^= hash >> 33;
+        hash *= 0xff51afd7ed558ccdull;
+        hash ^= hash >> 33;
+        return hash;
+    };
+    const std::uint64_t a = fnv(0xcbf29ce484222325ull);
+    const std::uint64_t b = fnv(0x84222325cbf29ce4ull);
+    char out[40];
+    std::snprintf(out, sizeof out, "%08" PRIx64 "-%08" PRIx64 "-%04" PRIx64 "-%012" PRIx64, a >> 32,
+                  a & std::uint64_t{0xffffffff}, b >> 48, b & std::uint64_t{0xffffffffffff});
+    return out;
+}
+
+State Parse(std::istream& in, const std::string& source)
+{
+    State st;
+    try {
+        StreamingReader reader(st);
+        json::sax_parse(in, &reader, json::input_format_t::json, true, false);
+        if (!reader.root.is_object())
+            throw PlaceError{"", std::string("expected a JSON object at the top level, found ") +
+                                     reader.root.type_name()};
+        for (const auto& [key, value] : reader.root.items()) {
+            const Where at{nullptr, key, -1};
+            if (key == "fileSystems" && reader.StreamedFileSystems() && value.is_array() && value.empty())
+                st.Mark(TopKey::fileSystems);
+            else
+                ReadTopKey(st, key, value, at);
+        }
+    } catch (const PlaceError& e) {
+        throw StateError("Invalid host state file '" + source + "': " + (e.where.empty() ? "" : e.where + ": ") +
+                         e.what);
+    }
+    return st;
+}
+
+State Demo()
+{
+    std::istringstream in(kDemoHost);
+    return Parse(in, "built-in demo host");
+}
+
+void Write(const State& st, std::ostream& out)
+{
+    bool first = true;
+    auto key = [&](const char* name) {
+        out << (first ? "{\n  \"" : ",\n  \"") << name << "\": ";
+        first = false;
+    };
+    auto value = [&](const ojson& v) { WriteReindented(out, v, "  "); };
+
+    if (st.Has(TopKey::features) || std::any_of(std::begin(st.features), std::end(st.features),
+                                                 [](const auto& f) { return f.has_value(); })) {
+        ojson features = ojson::object();
+        for (int i = 0; i < 4; ++i)
+            if (st.features[i])
+                features[kFeatureKeys[i]] = *st.features[i];
+        key("features");
+        value(features);
+    }
+    if (st.Has(TopKey::advancedOptions) || !st.advancedOptions.empty()) {
+        ojson groups = ojson::object();
+        for (const auto& [group, options] : st.advancedOptions) {
+            ojson entries = ojson::object();
+            for (const auto& [name, option] : options)
+                std::visit([&, &name = name](const auto& v) { entries[name] = v; }, option);
+            groups[group] = std::move(entries);
+        }
+        key("advancedOptions");
+        value(groups);
+    }
+    if (st.Has(TopKey::behaviour) || st.tryMount) {
+        ojson behaviour = ojson::object();
+        if (st.tryMount)
+            behaviour["tryMount"] = *st.tryMount;
+        key("behaviour");
+        value(behaviour);
+    }
+    if (st.Has(TopKey::fileSystems) || !st.fileSystems.empty()) {
+        key("fileSystems");
+        if (st.fileSystems.empty()) {
+            out << "[]";
+        } else {
+            const char* separator = "[\n    ";
+            for (const auto& fs : st.fileSystems) {
+                out << separator;
+                WriteReindented(out, WriteFileSystem(fs), "    ");
+                separator = ",\n    ";
+            }
+            out << "\n  ]";
+        }
+    }
+    if (st.Has(TopKey::pendingRescan) || !st.pendingFileSystems.empty() || !st.pendingUnresolved.empty()) {
+        ojson pending = ojson::object();
+        if (st.pendingHasFileSystems || !st.pendingFileSystems.empty())
+            pending["fileSystems"] = ListOf(st.pendingFileSystems, WriteFileSystem);
+        if (st.pendingHasUnresolved || !st.pendingUnresolved.empty())
+            pending["unresolvedVolumes"] = ListOf(st.pendingUnresolved, WriteUnresolved);
+        key("pendingRescan");
+        value(pending);
+    }
+    if (st.Has(TopKey::unresolvedVolumes) || !st.unresolvedVolumes.empty()) {
+        key("unresolvedVolumes");
+        value(ListOf(st.unresolvedVolumes, WriteUnresolved));
+    }
+    if (st.Has(TopKey::nfsExports) || !st.nfsExports.empty()) {
+        key("nfsExports");
+        value(ListOf(st.nfsExports, [](const NfsExport& e) -> ojson {
+            return {{"host", e.host}, {"share", e.share}, {"capacity", e.capacity}, {"used", e.used}};
+        }));
+    }
+    if (st.Has(TopKey::firewall) || st.nfsClient || st.nfs41Client) {
+        ojson firewall = ojson::object();
+        if (st.nfsClient)
+            firewall["nfsClient"] = *st.nfsClient;
+        if (st.nfs41Client)
+            firewall["nfs41Client"] = *st.nfs41Client;
+        key("firewall");
+        value(firewall);
+    }
+    if (st.Has(TopKey::heaps) || !st.heaps.empty()) {
+        key("heaps");
+        value(ListOf(st.heaps, [](const Heap& h) -> ojson {
+            return {{"name", h.name}, {"size", h.size}, {"maxSize", h.maxSize}};
+        }));
+    }
+    if (st.Has(TopKey::pointerBlockCache)) {
+        const auto& c = st.pointerBlockCache;
+        key("pointerBlockCache");
+        value(ojson{{"cacheSize", c.cacheSize},
+                    {"cacheSizeMax", c.cacheSizeMax},
+                    {"workingSet", c.workingSet},
+                    {"workingSetMax", c.workingSetMax},
+                    {"heapOverhead", c.heapOverhead},
+                    {"capacityMissRatio", c.capacityMissRatio}});
+    }
+    if (st.Has(TopKey::faults) || !st.faults.empty()) {
+        key("faults");
+        value(ListOf(st.faults, [](const Fault& f) -> ojson {
+            ojson out = {{"call", f.call}};
+            if (f.target)
+                out["target"] = *f.target;
+            out["message"] = f.message;
+            if (f.skip)
+                out["skip"] = f.skip;
+            if (f.times)
+                out["times"] = *f.times;
+            return out;
+        }));
+    }
+    out << (first ? "{}\n" : "\n}\n");
+}
+
+} // namespace HostSim::Model
