@@ -1,0 +1,133 @@
+// The built autocli as a user runs it: plug-in loading, exit codes and the streams.
+
+#include <gtest/gtest.h>
+
+#include <unistd.h>
+
+#include <algorithm>
+#include <filesystem>
+#include <fstream>
+
+#include <nlohmann/json.hpp>
+
+#include "support/Cli.h"
+
+namespace fs = std::filesystem;
+using TestSupport::RunAutocli;
+
+namespace {
+
+class Autocli : public ::testing::Test {
+protected:
+    void SetUp() override
+    {
+        dir_ = fs::temp_directory_path() / ("fw-e2e-" + std::to_string(::getpid()) + "-" +
+                                            ::testing::UnitTest::GetInstance()->current_test_info()->name());
+        fs::remove_all(dir_);
+        fs::create_directories(dir_ / "plugins");
+    }
+    void TearDown() override { fs::remove_all(dir_); }
+
+    std::string State(const std::string& json)
+    {
+        const auto path = (dir_ / "host.json").string();
+        std::ofstream(path) << json;
+        return path;
+    }
+    std::string DemoState() const { return (dir_ / "absent.json").string(); }
+    std::string PluginEnv() const { return "AUTOCLI_PLUGIN_PATH=" + (dir_ / "plugins").string(); }
+
+    fs::path dir_;
+};
+
+TEST_F(Autocli, RunsACommandAndPrintsByFormatter)
+{
+    auto silent = RunAutocli({"storage", "filesystem", "rescan"}, DemoState());
+    EXPECT_EQ(silent.exitCode, 0) << silent.err;
+    EXPECT_EQ(silent.out, "");
+    EXPECT_EQ(silent.err, "");
+    auto json = RunAutocli({"storage", "filesystem", "rescan", "--formatter", "json"}, DemoState());
+    EXPECT_EQ(json.exitCode, 0);
+    EXPECT_EQ(json.out, "true\n");
+}
+
+TEST_F(Autocli, HostFailureOutsideTheGuardIsExitThree)
+{
+    const auto state = State(R"({"faults": [{"call": "StorageInfoImpl.new", "message": "Host agent is not responding"}]})");
+    auto result = RunAutocli({"storage", "filesystem", "rescan"}, state);
+    EXPECT_EQ(result.exitCode, 3);
+    EXPECT_EQ(result.out, "");
+    EXPECT_EQ(result.err, "Host agent is not responding\n");
+}
+
+struct UsageRun {
+    std::vector<std::string> args;
+    std::string start;
+};
+
+TEST_F(Autocli, UsageErrorsAreOneLineAndExitTwo)
+{
+    const std::vector<UsageRun> runs{
+        {{"storage", "filesystem", "nope"}, "Unknown namespace or command 'nope' in 'storage filesystem'."},
+        {{"storage", "filesystem", "rescan", "--x"}, "Unknown parameter '--x' for 'storage filesystem rescan'."},
+        {{"--formatter"}, "Option '--formatter' needs a value."},
+        {{"storage"}, "'storage' is a namespace: name one of its commands."},
+    };
+    for (const auto& run : runs) {
+        auto result = RunAutocli(run.args, DemoState());
+        EXPECT_EQ(result.exitCode, 2) << run.start;
+        EXPECT_EQ(result.out, "");
+        EXPECT_EQ(result.err.rfind(run.start, 0), 0u) << result.err;
+        EXPECT_EQ(std::count(result.err.begin(), result.err.end(), '\n'), 1) << result.err;
+    }
+}
+
+TEST_F(Autocli, HelpVersionAndStateDump)
+{
+    auto help = RunAutocli({"storage", "--help"}, DemoState());
+    EXPECT_EQ(help.exitCode, 0);
+    EXPECT_NE(help.out.find("Manage storage on the Zephal host."), std::string::npos) << help.out;
+    EXPECT_LT(help.out.find("  filesystem"), help.out.find("  nfs "));
+
+    auto version = RunAutocli({"--version"});
+    EXPECT_EQ(version.exitCode, 0);
+    EXPECT_EQ(version.out.rfind("autocli ", 0), 0u);
+
+    auto dump = RunAutocli({"--dump-state"}, State(R"({"features": {"102": true}})"));
+    EXPECT_EQ(dump.exitCode, 0) << dump.err;
+    EXPECT_EQ(nlohmann::json::parse(dump.out)["features"]["102"], true);
+
+    auto bad = RunAutocli({"--dump-state"}, State("{not json"));
+    EXPECT_EQ(bad.exitCode, 1);
+    EXPECT_NE(bad.err.find("host.json"), std::string::npos) << bad.err;
+}
+
+TEST_F(Autocli, PluginFolderDecidesTheTree)
+{
+    auto empty = RunAutocli({"storage", "--help"}, DemoState(), {PluginEnv()});
+    EXPECT_EQ(empty.exitCode, 0);
+    EXPECT_NE(empty.out.find("This namespace has no commands."), std::string::npos) << empty.out;
+
+    auto missing = RunAutocli({"storage", "--help"}, DemoState(), {"AUTOCLI_PLUGIN_PATH=" + (dir_ / "none").string()});
+    EXPECT_EQ(missing.exitCode, 3);
+    EXPECT_NE(missing.err.find((dir_ / "none").string()), std::string::npos) << missing.err;
+}
+
+TEST_F(Autocli, BrokenPluginIsNamedNotACrash)
+{
+    std::ofstream(dir_ / "plugins" / "junk.so") << "not a library";
+    auto junk = RunAutocli({"storage", "--help"}, DemoState(), {PluginEnv()});
+    EXPECT_EQ(junk.exitCode, 3);
+    EXPECT_EQ(junk.err.rfind("Cannot load plug-in '" + (dir_ / "plugins" / "junk.so").string() + "'", 0), 0u) << junk.err;
+
+    // A second copy of the real plug-in registers the same names again.
+    fs::remove(dir_ / "plugins" / "junk.so");
+    fs::copy_file(STORAGECLI_PLUGIN, dir_ / "plugins" / "a.so");
+    fs::copy_file(STORAGECLI_PLUGIN, dir_ / "plugins" / "b.so");
+    auto twice = RunAutocli({"storage", "--help"}, DemoState(), {PluginEnv()});
+    EXPECT_EQ(twice.exitCode, 3);
+    EXPECT_EQ(twice.err.rfind("Plug-in '" + (dir_ / "plugins" / "b.so").string() + "' failed to register: ", 0), 0u)
+        << twice.err;
+}
+
+} // namespace
