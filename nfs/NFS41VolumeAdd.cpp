@@ -52,7 +52,8 @@ std::shared_ptr<InputSpec> NFS41VolumeAdd::GetInputSpecInternal()
                         "The hostname(s) or IP address(es) (comma-separated) of the server for the NFS v4.1 volume "
                         "to add and mount on the system.",
                         !knxnicBinding});
-    AddParameter(spec, {NfsAddArg::kIsPE, "p", ParameterType::Flag, "If set, this flag will set the mount point to be PE."});
+    AddParameter(spec,
+                 {NfsAddArg::kIsPE, "p", ParameterType::Flag, "If set, this flag will set the mount point to be PE."});
     AddParameter(spec, {NfsAddArg::kShare, "s", ParameterType::String,
                         "The share name on the remote system to use for this NFS v4.1 mount point.", true});
     AddParameter(spec, {NfsAddArg::kVolumeName, "v", ParameterType::String,
@@ -62,14 +63,14 @@ std::shared_ptr<InputSpec> NFS41VolumeAdd::GetInputSpecInternal()
     AddParameter(spec, {NfsAddArg::kReadOnly, "r", ParameterType::Flag,
                         "If set, this flag will make the mount point be read-only."});
     AddParameter(
-        spec, {kSecurity, "a", ParameterType::String, "Security flavors. Acceptable values are: %ENUM%.", false,
-               StringEnum({
-                   {NetworkFileSystem::NFS_AUTH_SYS_STR.c_str(), "Authentication based on traditional UNIX ID"},
-                   {NetworkFileSystem::NFS_AUTH_KRB5_STR.c_str(),
-                    "Kerberos authentication with RPC header integrity protection"},
-                   {NetworkFileSystem::NFS_AUTH_KRB5I_STR.c_str(),
-                    "Kerberos authentication with data integrity protection"},
-               })});
+        spec,
+        {kSecurity, "a", ParameterType::String, "Security flavors. Acceptable values are: %ENUM%.", false,
+         StringEnum({
+             {NetworkFileSystem::NFS_AUTH_SYS_STR.c_str(), "Authentication based on traditional UNIX ID"},
+             {NetworkFileSystem::NFS_AUTH_KRB5_STR.c_str(),
+              "Kerberos authentication with RPC header integrity protection"},
+             {NetworkFileSystem::NFS_AUTH_KRB5I_STR.c_str(), "Kerberos authentication with data integrity protection"},
+         })});
     return spec;
 }
 

@@ -60,8 +60,9 @@ std::shared_ptr<InputSpec> NFSVolumeAdd::GetInputSpecInternal()
 {
     const bool knxnicBinding = IsFeatureEnabled(Feature::NfsKnxnicBinding);
     auto spec = InputSpec::New();
-    AddParameter(spec, {kHost, "H", ParameterType::String,
-                        "The hostname or IP address of the NAS volume to add and mount on the system.", !knxnicBinding});
+    AddParameter(spec,
+                 {kHost, "H", ParameterType::String,
+                  "The hostname or IP address of the NAS volume to add and mount on the system.", !knxnicBinding});
     if (knxnicBinding) {
         AddParameter(spec, {NfsAddArg::kHostKnxnic, "I", ParameterType::String,
                             "The hostname or IP address of the NAS volume to add, followed by a colon(:) and knxnic "
@@ -82,7 +83,8 @@ std::shared_ptr<InputSpec> NFSVolumeAdd::GetInputSpecInternal()
     }
     AddParameter(spec, {NfsAddArg::kReadOnly, "r", ParameterType::Flag,
                         "If set this flag will set the mount point to be read-only."});
-    AddParameter(spec, {NfsAddArg::kIsPE, "p", ParameterType::Flag, "If set this flag will set the mount point to be PE."});
+    AddParameter(spec,
+                 {NfsAddArg::kIsPE, "p", ParameterType::Flag, "If set this flag will set the mount point to be PE."});
     AddParameter(spec, {kMountRetry, "", ParameterType::Flag, ""});
     AddParameter(spec, {kQueueDepth, "", ParameterType::Int, "", false, IntRange(1, 4294967295L)});
     return spec;

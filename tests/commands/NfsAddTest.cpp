@@ -61,8 +61,8 @@ std::vector<json> ArgsOf(const TestSupport::ScopedHost& host, const std::string&
 
 struct AddCase {
     const char* features;
-    const char* words; // besides share=/exp volume-name=nas9
-    const char* error; // "" for success
+    const char* words;   // besides share=/exp volume-name=nas9
+    const char* error;   // "" for success
     const char* addArgs; // "" when the host must not be asked
     int mountFlags;
 };
@@ -74,9 +74,11 @@ TEST(NfsAddTest, V3ArgumentsReachTheHostAsDecided)
         {R"({"104": true})", "", "Either hostName or knxnic shoud be provided", "", 0},
         {R"({"104": true})", "host-knxnic=srv:eth0", "Invalid host-knxnic input", "", 0},
         {R"({"104": true})", "host-knxnic=srv:eth0 unsupported-queue-depth#=5", "Invalid host-knxnic input", "", 0},
-        {"{}", "host=srv unsupported-queue-depth#=5", "unsupported-queue-depth requires unsupported-mount-retry flag", "", 0},
+        {"{}", "host=srv unsupported-queue-depth#=5", "unsupported-queue-depth requires unsupported-mount-retry flag",
+         "", 0},
         {R"({"104": true})", "host-knxnic=srv:knx1", "", R"(["srv","/exp","nas9",true,"knx1",0,1])", 0},
-        {R"({"104": true})", "host-knxnic=fe80::1:knx0:knx3", "", R"(["fe80::1","/exp","nas9",true,"knx0:knx3",0,1])", 0},
+        {R"({"104": true})", "host-knxnic=fe80::1:knx0:knx3", "", R"(["fe80::1","/exp","nas9",true,"knx0:knx3",0,1])",
+         0},
         {R"({"104": true})", "host-knxnic=:knx2", "", R"(["","/exp","nas9",true,"knx2",0,1])", 0},
         {"{}", "host=srv host-knxnic=x:knx1 connections#=4", "", R"(["srv","/exp","nas9",false,"",0,1])", 0},
         {R"({"103": true})", "host=srv connections#=8", "", R"(["srv","/exp","nas9",false,"",0,8])", 0},
@@ -87,8 +89,8 @@ TEST(NfsAddTest, V3ArgumentsReachTheHostAsDecided)
     for (const auto& c : cases) {
         SCOPED_TRACE(std::string(c.features) + " " + c.words);
         TestSupport::ScopedHost host(State(c.features, R"(["srv", "fe80::1", ""])"));
-        const auto result =
-            TestSupport::Execute(*NFSVolumeAdd::New(), MakeInput(std::string("share=/exp volume-name=nas9 ") + c.words));
+        const auto result = TestSupport::Execute(*NFSVolumeAdd::New(),
+                                                 MakeInput(std::string("share=/exp volume-name=nas9 ") + c.words));
         if (c.error[0] != '\0') {
             EXPECT_EQ(result.errors, std::vector<std::string>{c.error});
             EXPECT_EQ(result.root, nullptr);
@@ -116,8 +118,8 @@ TEST(NfsAddTest, V41ServerListAndSecurityReachTheHostAsDecided)
     for (const auto& c : cases) {
         SCOPED_TRACE(std::string(c.features) + " " + c.words);
         TestSupport::ScopedHost host(State(c.features));
-        const auto result =
-            TestSupport::Execute(*NFS41VolumeAdd::New(), MakeInput(std::string("share=/exp volume-name=nas9 ") + c.words));
+        const auto result = TestSupport::Execute(*NFS41VolumeAdd::New(),
+                                                 MakeInput(std::string("share=/exp volume-name=nas9 ") + c.words));
         if (c.error[0] != '\0') {
             EXPECT_EQ(result.errors, std::vector<std::string>{c.error});
             EXPECT_TRUE(host.Journal().empty());
@@ -151,13 +153,14 @@ TEST(NfsAddTest, FailedMountCleansUpOrKeepsTheDefinition)
         SCOPED_TRACE(std::string(c.v41 ? "v4.1 " : "v3 ") + c.features + (c.removalFails ? " removal fails" : ""));
         json state = json::parse(State(c.features));
         if (c.removalFails) {
-            state["faults"] = json::parse(
-                R"([{"call": "StorageInfoImpl.RemoveNetworkFileSystem", "message": "removal refused"}])");
+            state["faults"] =
+                json::parse(R"([{"call": "StorageInfoImpl.RemoveNetworkFileSystem", "message": "removal refused"}])");
         }
         TestSupport::ScopedHost host(state.dump());
-        const auto result = c.v41
-            ? TestSupport::Execute(*NFS41VolumeAdd::New(), MakeInput("hosts+=nowhere share=/exp volume-name=nas9"))
-            : TestSupport::Execute(*NFSVolumeAdd::New(), MakeInput("host=nowhere share=/exp volume-name=nas9"));
+        const auto result =
+            c.v41
+                ? TestSupport::Execute(*NFS41VolumeAdd::New(), MakeInput("hosts+=nowhere share=/exp volume-name=nas9"))
+                : TestSupport::Execute(*NFSVolumeAdd::New(), MakeInput("host=nowhere share=/exp volume-name=nas9"));
         EXPECT_EQ(result.errors, c.errors);
         EXPECT_EQ(result.root, nullptr);
         EXPECT_EQ(host.State().value("fileSystems", json::array()).size(), c.definitionStays ? 1U : 0U);
@@ -172,7 +175,8 @@ TEST(NfsAddTest, StorageInfoFailureIsAMessageOnlyForV41)
     const auto v41 = TestSupport::Execute(*NFS41VolumeAdd::New(), MakeInput("hosts+=srv share=/exp volume-name=nas9"));
     EXPECT_EQ(v41.errors, std::vector<std::string>{"no storage"});
     auto out = Output::New();
-    EXPECT_THROW(NFSVolumeAdd::New()->Execute(MakeInput("host=srv share=/exp volume-name=nas9"), out), HostCtlException);
+    EXPECT_THROW(NFSVolumeAdd::New()->Execute(MakeInput("host=srv share=/exp volume-name=nas9"), out),
+                 HostCtlException);
 }
 
 } // namespace

@@ -56,7 +56,8 @@ TEST(NfsRemoveTest, RemovalIsNotifiedBeforeAndAfterAFailure)
             json{{"call", "StorageInfoImpl.RemoveNetworkFileSystem"}, {"args", {c.volume, c.v41 ? 2 : 1}}},
         };
         if (failed) {
-            expected.push_back(json{{"call", "AutoCli_ShellCmd"}, {"args", {kNotify + "FailedUnmount -i stdin", c.volume}}});
+            expected.push_back(
+                json{{"call", "AutoCli_ShellCmd"}, {"args", {kNotify + "FailedUnmount -i stdin", c.volume}}});
         }
         std::vector<json> seen;
         for (const auto& line : host.Journal()) {
