@@ -17,10 +17,9 @@ namespace {
 template <typename T, typename V>
 void Set(FileSystemRecord& record, T& field, const V& value, FsKey key)
 {
-    if (field == value && record.Has(key))
+    if (field == value)
         return;
-    if (field != value)
-        Runtime::MarkDirty();
+    Runtime::MarkDirty();
     field = value;
     record.Mark(key);
 }
@@ -475,10 +474,9 @@ namespace {
 template <typename T, typename V>
 void SetKey(FileSystemRecord& record, T& field, const V& value, FsKey key)
 {
-    if (field == value && record.Has(key))
+    if (field == value)
         return;
-    if (field != value)
-        Runtime::MarkDirty();
+    Runtime::MarkDirty();
     field = value;
     record.Mark(key);
 }

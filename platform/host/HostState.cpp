@@ -1,5 +1,6 @@
 #include "HostState.h"
 
+#include <algorithm>
 #include <cinttypes>
 #include <cstdio>
 #include <functional>
@@ -399,6 +400,7 @@ UnresolvedVolume ReadUnresolved(const json& v, const Where& w)
     if (!v.is_object())
         WrongType(w, "an object or null", v);
     EachKey(v, w, [&](const std::string& key, const json& value, const Where& at) {
+        u.Mark(key);
         if (key == "volumeName") {
             u.volumeName = Str(value, at);
         } else if (key == "uuid") {
@@ -461,12 +463,20 @@ ojson WriteUnresolved(const UnresolvedVolume& u)
     out["volumeName"] = u.volumeName;
     if (u.uuidGiven)
         out["uuid"] = u.uuid;
-    if (!u.lvmUuid.empty())
+    if (u.Has("lvmUuid") || !u.lvmUuid.empty())
         out["lvmUuid"] = u.lvmUuid;
-    out["majorVersion"] = u.majorVersion;
-    out["capacity"] = u.capacity;
-    out["mountReason"] = u.mountReason;
-    out["resignatureReason"] = u.resignatureReason;
+    if (u.Has("impl") || !u.impl)
+        out["impl"] = u.impl;
+    if (u.Has("majorVersion") || u.majorVersion != 6)
+        out["majorVersion"] = u.majorVersion;
+    if (u.Has("capacity") || u.capacity != 0)
+        out["capacity"] = u.capacity;
+    if (u.Has("mountReason") || u.mountReason != 0)
+        out["mountReason"] = u.mountReason;
+    if (u.Has("resignatureReason") || u.resignatureReason != 0)
+        out["resignatureReason"] = u.resignatureReason;
+    if (!u.Has("extents") && u.extents.empty())
+        return out;
     ojson extents = ojson::array();
     for (const auto& e : u.extents) {
         if (e.null) {
@@ -479,8 +489,6 @@ ojson WriteUnresolved(const UnresolvedVolume& u)
         extents.push_back(std::move(x));
     }
     out["extents"] = std::move(extents);
-    if (!u.impl)
-        out["impl"] = false;
     return out;
 }
 
@@ -929,6 +937,31 @@ void ResolveDefaults(FileSystemRecord& fs)
         if (!fs.Has(FsKey::securityType))
             nfs.securityType = fs.kind == FsKind::Nfs41 ? 1 : 0;
     }
+}
+
+namespace {
+constexpr std::string_view kUnresolvedKeys[] = {"volumeName", "uuid", "lvmUuid", "majorVersion", "capacity",
+                                                "mountReason", "resignatureReason", "extents", "impl"};
+
+int UnresolvedKeyBit(std::string_view key)
+{
+    for (int i = 0; i < static_cast<int>(std::size(kUnresolvedKeys)); ++i)
+        if (kUnresolvedKeys[i] == key)
+            return i;
+    return -1;
+}
+} // namespace
+
+bool UnresolvedVolume::Has(std::string_view key) const
+{
+    const int bit = UnresolvedKeyBit(key);
+    return bit >= 0 && ((present >> bit) & 1u);
+}
+
+void UnresolvedVolume::Mark(std::string_view key)
+{
+    if (const int bit = UnresolvedKeyBit(key); bit >= 0)
+        present = static_cast<std::uint16_t>(present | (1u << bit));
 }
 
 void ResolveDefaults(UnresolvedVolume& volume)

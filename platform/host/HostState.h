@@ -139,6 +139,10 @@ struct UnresolvedVolume {
     std::uint32_t resignatureReason = 0;
     std::vector<UnresolvedExtent> extents;
     bool impl = true;
+    std::uint16_t present = 0; // keys given in the state, written back even when default
+
+    bool Has(std::string_view key) const;
+    void Mark(std::string_view key);
 };
 
 struct NfsExport {

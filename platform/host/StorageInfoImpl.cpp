@@ -96,9 +96,8 @@ void SetPreUnmount(const char* call, const std::string& name, bool on)
         if (pos == std::string::npos)
             Runtime::Throw("NFS volume '" + name + "' not found");
         FileSystemRecord& fs = st.fileSystems[pos];
-        if (fs.preUnmount != on || !fs.Has(FsKey::preUnmount)) {
-            if (fs.preUnmount != on)
-                Runtime::MarkDirty();
+        if (fs.preUnmount != on) {
+            Runtime::MarkDirty();
             fs.preUnmount = on;
             fs.Mark(FsKey::preUnmount);
         }
@@ -164,7 +163,7 @@ public:
         const Runtime::JournalEntry journal{"", J::array()};
         HostCall("PointerBlockCache.ResetStatistics", {}, &journal, [](State& st) {
             auto& c = st.pointerBlockCache;
-            if (c.capacityMissRatio != 0 || c.workingSetMax != c.workingSet || !st.Has(TopKey::pointerBlockCache)) {
+            if (c.capacityMissRatio != 0 || c.workingSetMax != c.workingSet) {
                 c.capacityMissRatio = 0;
                 c.workingSetMax = c.workingSet;
                 st.Mark(TopKey::pointerBlockCache);

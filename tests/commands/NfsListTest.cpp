@@ -1,5 +1,6 @@
-// storage nfs list / nfs41 list: the translations, the row shapes the feature switches
-// choose, and the per-volume skipping.
+// storage nfs list / nfs41 list and param get: the translations and the row shapes the
+// feature switches choose. What the commands print is covered by the nfs-list and
+// nfs-param fixture cases.
 
 #include <string>
 #include <vector>
@@ -9,7 +10,6 @@
 
 #include "nfs/NFSVolumeList.h"
 #include "nfs/NFSVolumeParam.h"
-#include "support/Cli.h"
 #include "support/HostFixture.h"
 
 using namespace OrvaneCli::FileSystem;
@@ -24,30 +24,6 @@ std::vector<std::string> Titles(const MetaStruct& structure)
         titles.push_back(title);
     }
     return titles;
-}
-
-// Every row of a list result, as title -> printed value.
-std::vector<json> Rows(const TestSupport::CommandResult& result)
-{
-    std::vector<json> rows;
-    auto list = std::dynamic_pointer_cast<MetaList>(result.root);
-    if (!list) {
-        return rows;
-    }
-    for (const auto& element : list->GetElements()) {
-        json row = json::object();
-        for (const auto& [title, value] : element->GetFields()) {
-            if (auto s = std::dynamic_pointer_cast<MetaString>(value)) {
-                row[title] = s->GetValue();
-            } else if (auto i = std::dynamic_pointer_cast<MetaInt>(value)) {
-                row[title] = i->GetValue();
-            } else if (auto b = std::dynamic_pointer_cast<MetaBool>(value)) {
-                row[title] = b->GetValue();
-            }
-        }
-        rows.push_back(row);
-    }
-    return rows;
 }
 
 TEST(NfsListTest, TranslationsCoverEveryKnownValueAndFallBack)
@@ -116,88 +92,6 @@ TEST(NfsListTest, SwitchesChooseFieldsAndNeverLeakAcrossVersions)
         EXPECT_EQ(Titles(*NFSVolumeParamGet::New()->GetOutputStructure()), c.v3Params);
         EXPECT_EQ(Titles(*NFS41VolumeParamGet::New()->GetOutputStructure()), c.v41Params);
         EXPECT_EQ(NFSVolumeList::New()->GetDefaultOutputParameters().at("fields:NasMount"), c.v3Hint);
-    }
-}
-
-const char* const kListState = R"({"features": {"102": true, "103": true, "104": true}, "fileSystems": [
-    {"type": "NFS", "volumeName": "nas1", "remoteHost": "srv1", "remoteShare": "/a", "knxnic": "knx0",
-     "connections": 3, "qaxiState": 1, "readOnly": true},
-    {"type": "NFS", "volumeName": "nas2", "remoteHost": "srv2", "remoteShare": "/b", "qaxiState": 2},
-    {"type": "NFS", "volumeName": "nas3", "remoteHost": "srv3", "remoteShare": "/c", "isPE": true, "qaxiState": 9},
-    {"type": "NFS", "volumeName": "nas4", "hidden": true},
-    {"type": "NFS41", "volumeName": "v41a", "remoteHosts": ["10.0.0.1", "10.0.0.2"], "remoteShare": "/d",
-     "knxnics": "knx1,knx2", "readOnly": false, "readOnlyState": true, "securityType": 2},
-    {"type": "NFS41", "volumeName": "v41b", "remoteShare": "/e", "readOnly": true, "readOnlyState": false,
-     "securityType": 4, "isPE": true}]})";
-
-TEST(NfsListTest, RowsFollowTheVolumesAndAFailingVolumeIsSkipped)
-{
-    const struct {
-        bool v41;
-        bool peOnly;
-        const char* fault; // fault entries, JSON
-        std::vector<std::string> names;
-        std::vector<std::string> errors;
-    } cases[] = {
-        {false, false, "[]", {"nas1", "nas2", "nas3"}, {}},
-        {false, true, "[]", {"nas3"}, {}},
-        {false, false, R"([{"call": "FileSystem.GetQAXIState", "target": "nas2", "message": "lost"}])",
-         {"nas1", "nas3"}, {"Error getting data for mount 'nas2': lost, skipping."}},
-        {true, false, "[]", {"v41a", "v41b"}, {}},
-        {true, true, "[]", {"v41b"}, {}},
-        {true, false, R"([{"call": "NetworkFileSystem.GetRemoteHosts", "target": "v41a", "message": "gone"}])",
-         {"v41b"}, {"Error getting data for mount 'v41a': gone, skipping."}},
-    };
-    for (const auto& c : cases) {
-        SCOPED_TRACE(::testing::Message() << (c.v41 ? "v4.1 " : "v3 ") << c.fault);
-        json state = json::parse(kListState);
-        state["faults"] = json::parse(c.fault);
-        TestSupport::ScopedHost host(state.dump());
-        auto in = Input::New();
-        if (c.peOnly) {
-            in->SetFlag("pe-only");
-        }
-        const auto result = c.v41 ? TestSupport::Execute(*NFS41VolumeList::New(), in)
-                                  : TestSupport::Execute(*NFSVolumeList::New(), in);
-        std::vector<std::string> names;
-        for (const auto& row : Rows(result)) {
-            names.push_back(row["Volume Name"]);
-        }
-        EXPECT_EQ(names, c.names);
-        EXPECT_EQ(result.errors, c.errors);
-    }
-}
-
-TEST(NfsListTest, RowValuesComeFromTheRightGetters)
-{
-    TestSupport::ScopedHost host(kListState);
-    const auto v3 = Rows(TestSupport::Execute(*NFSVolumeList::New(), Input::New()));
-    ASSERT_EQ(v3.size(), 3u);
-    EXPECT_EQ(v3[0], json::parse(R"({"Volume Name": "nas1", "Host": "srv1", "Share": "/a", "Knxnic": "knx0",
-        "Connections": 3, "Accessible": true, "Mounted": true, "Read-Only": true, "isPE": false,
-        "Hardware Acceleration": "Supported"})"));
-    EXPECT_EQ(v3[1]["Hardware Acceleration"], "Not Supported");
-    EXPECT_EQ(v3[2]["Hardware Acceleration"], "Unknown");
-
-    // The v4.1 list reads the read-only state, not the read-only setting.
-    const auto v41 = Rows(TestSupport::Execute(*NFS41VolumeList::New(), Input::New()));
-    ASSERT_EQ(v41.size(), 2u);
-    EXPECT_EQ(v41[0], json::parse(R"J({"Volume Name": "v41a", "Host(s)": "10.0.0.1,10.0.0.2", "Share": "/d",
-        "Knxnics": "knx1,knx2", "Accessible": true, "Mounted": true, "Read-Only": true, "Security": "krb5",
-        "isPE": false, "Hardware Acceleration": "Unknown"})J"));
-    EXPECT_EQ(v41[1]["Host(s)"], "");
-    EXPECT_EQ(v41[1]["Read-Only"], false);
-    EXPECT_EQ(v41[1]["Security"], "krb5p");
-}
-
-TEST(NfsListTest, FailureToFetchOrToOpenTheHostIsOneMessageWithoutResult)
-{
-    for (const char* call : {"StorageInfoImpl.new", "StorageInfoImpl.GetV3NetworkFileSystems"}) {
-        SCOPED_TRACE(call);
-        TestSupport::ScopedHost host(json{{"faults", {{{"call", call}, {"message", "down"}}}}}.dump());
-        const auto result = TestSupport::Execute(*NFSVolumeList::New(), Input::New());
-        EXPECT_EQ(result.errors, std::vector<std::string>{"down"});
-        EXPECT_EQ(result.root, nullptr);
     }
 }
 

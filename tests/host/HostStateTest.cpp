@@ -1,0 +1,254 @@
+// The state file: checking, persistence, the demo host and the session lock.
+
+#include <fstream>
+#include <functional>
+#include <sstream>
+#include <stdexcept>
+
+#include <gtest/gtest.h>
+#include <sys/file.h>
+#include <fcntl.h>
+#include <unistd.h>
+
+#include "FeatureList.h"
+#include "host/HostSession.h"
+#include "hostctl/Host.h"
+#include "hostctl/HostCtlException.h"
+#include "hostctl/StorageInfoImpl.h"
+#include "support/HostFixture.h"
+
+namespace {
+
+using HostCtl::Lib::HostCtlException;
+using KnxCtl::Storage::StorageInfoImpl;
+using TestSupport::ScopedHost;
+using Fs = HostCtl::Storage::FileSystem;
+
+std::string ReadFile(const std::string& path)
+{
+    std::ifstream in(path, std::ios::binary);
+    std::ostringstream text;
+    text << in.rdbuf();
+    return text.str();
+}
+
+bool Exists(const std::string& path)
+{
+    return ::access(path.c_str(), F_OK) == 0;
+}
+
+std::string MessageOf(const std::function<void()>& call)
+{
+    try {
+        call();
+    } catch (const HostCtlException& e) {
+        return e.message;
+    }
+    return "(no exception)";
+}
+
+struct BadState {
+    const char* name;
+    const char* text;
+    const char* place; // must appear in the message after the file name
+};
+
+const BadState kBadStates[] = {
+    {"syntax", R"({"fileSystems": [})", "line 1, column 18"},
+    {"syntaxOnLaterLine", "{\n  \"features\": {\"102\": tru}\n}", "line 2, column"},
+    {"blank", " \n", "line 2"},
+    {"trailingJunk", "{} x", "line 1, column 4"},
+    {"topLevelArray", "[]", "expected a JSON object at the top level"},
+    {"wrongType", R"({"fileSystems": [{"type": "HLFS", "volumeName": "a", "capacity": "big"}]})",
+     "fileSystems[0].capacity: expected an unsigned integer, found string"},
+    {"negativeCapacity", R"({"fileSystems": [{"type": "HLFS", "volumeName": "a", "capacity": -1}]})",
+     "fileSystems[0].capacity: -1 is out of range"},
+    {"partitionTooLarge", R"({"fileSystems": [{"type": "HLFS", "volumeName": "a", "extents": [{"partition": 256}]}]})",
+     "fileSystems[0].extents[0].partition: 256 is out of range (0 to 255)"},
+    {"unknownTopKey", R"({"features": {"102": true, "270": true}, "fileSystem": []})", "fileSystem: unknown key"},
+    {"unknownNestedKey",
+     R"({"fileSystems": [{"type": "NFS", "volumeName": "a"}, {"type": "NFS", "volumeName": "b", "remoteHostz": ""}]})",
+     "fileSystems[1].remoteHostz: unknown key"},
+    {"missingRequired", R"({"fileSystems": [{"type": "HLFS"}]})", "fileSystems[0]: missing required key 'volumeName'"},
+    {"unknownFeature", R"({"features": {"102": true, "999": true}})", "features.999: unknown key"},
+    {"unresolvedExtent", R"({"unresolvedVolumes": [null, {"volumeName": "x", "extents": [null, {"start": "0"}]}]})",
+     "unresolvedVolumes[1].extents[1].start: expected an integer, found string"},
+    {"optionFloat", R"({"advancedOptions": {"HLFS3": {"EnableOnlineATSUpgrade": 1.5}}})",
+     "advancedOptions.HLFS3.EnableOnlineATSUpgrade: expected an integer or a string, found number"},
+    {"faultWithoutCall", R"({"faults": [{"message": "m"}]})", "faults[0]: missing required key 'call'"},
+    {"badMac", R"({"fileSystems": [{"type": "HLFS", "volumeName": "a", "users": [{"macAddress": "00:11"}]}]})",
+     "fileSystems[0].users[0].macAddress: expected a MAC address"},
+    {"pendingWrongType", R"({"pendingRescan": {"fileSystems": {}}})",
+     "pendingRescan.fileSystems: expected an array, found object"},
+};
+
+class BadStateTest : public ::testing::TestWithParam<BadState> {};
+
+TEST_P(BadStateTest, EveryCallFailsWithTheMessageAndTheFileIsKept)
+{
+    const BadState& bad = GetParam();
+    ScopedHost host(bad.text);
+    const std::string before = ReadFile(host.StatePath());
+
+    const std::string message = MessageOf([] { StorageInfoImpl info; });
+    EXPECT_EQ(message.rfind("Invalid host state file '" + host.StatePath() + "': ", 0), 0u) << message;
+    EXPECT_NE(message.find(bad.place), std::string::npos) << message;
+
+    const std::function<void()> calls[] = {
+        [] { StorageInfoImpl info; },
+        [] { HostCtl::HostFactory::GetHost()->GetStorageInfo(); },
+        [] { HostCtl::HostFactory::GetHost()->GetAdvancedOptions(); },
+        [] { KnxCtl::Storage::HlFileSystemImpl fs("/hlfs/volumes/a"); },
+        [] { StorageInfoImpl::RemoveNetworkFileSystem("a", HostCtl::Storage::NFS_VERSION_3); },
+        [] { KnxCtl::Storage::StorageInfoScopedCache cache(false); },
+        [] { HostSim::DumpState(); },
+    };
+    for (const auto& call : calls)
+        EXPECT_EQ(MessageOf(call), message);
+    for (int feature : {102, 103, 104, 270})
+        EXPECT_EQ(*FeatureList[feature], 0) << feature;
+
+    host.Reopen();
+    EXPECT_EQ(MessageOf([] { StorageInfoImpl info; }), message);
+    EXPECT_EQ(ReadFile(host.StatePath()), before);
+}
+
+INSTANTIATE_TEST_SUITE_P(Host, BadStateTest, ::testing::ValuesIn(kBadStates),
+                         [](const auto& info) { return std::string(info.param.name); });
+
+TEST(HostState, DemoHostIsWrittenOnlyByTheFirstChange)
+{
+    ScopedHost host("");
+    {
+        StorageInfoImpl info;
+        EXPECT_EQ(info.GetFileSystems().size(), 6u);
+        EXPECT_EQ(info.GetUnresolvedVolumes().size(), 1u);
+        info.AutoFullMountVolumes(); // everything is mounted already: no change
+        EXPECT_THROW(info.RemoveNasFirewallConfig("192.0.2.1", HostCtl::Storage::NFS_VERSION_3), HostCtlException);
+    }
+    for (int feature : {102, 103, 104, 270})
+        EXPECT_EQ(*FeatureList[feature], 1) << feature;
+    EXPECT_FALSE(Exists(host.StatePath()));
+    const std::string demo = HostSim::DumpState();
+
+    StorageInfoImpl().AddNasFirewallConfig("192.0.2.1", HostCtl::Storage::NFS_VERSION_3);
+    ASSERT_TRUE(Exists(host.StatePath()));
+    nlohmann::json expected = nlohmann::json::parse(demo);
+    expected["firewall"]["nfsClient"].push_back("192.0.2.1");
+    EXPECT_EQ(host.State(), expected);
+
+    host.Reopen();
+    auto rules = StorageInfoImpl().GetNasFirewallConfigs(HostCtl::Storage::NFS_VERSION_3);
+    EXPECT_EQ(rules.back(), "192.0.2.1");
+}
+
+TEST(HostState, SavingKeepsEveryKeyAndExactValues)
+{
+    const nlohmann::json original = nlohmann::json::parse(R"({
+      "features": {"103": true},
+      "behaviour": {"tryMount": false},
+      "fileSystems": [
+        {"type": "HLFS", "volumeName": "big", "capacity": 18446744073709551615, "used": 9223372036854775809,
+         "majorVersion": 5, "lockMode": 4294967295, "extents": [{"deviceName": "d1", "partition": 255}],
+         "users": [{"heartbeatUuid": "h", "macAddress": "00:1e:67:c4:d2:a8", "driverVersionMajor": 1,
+                    "driverVersionMinor": 2, "heartbeatOffset": -5, "lockModeInUse": 1, "live": false}],
+         "unmapProperty": {"granularity": 4096, "priority": "high", "bandwidth": -1, "reserved": 7, "method": "fixed"}},
+        {"type": "NFS41", "volumeName": "n", "remoteHosts": ["a", "b"], "remoteShare": "/s", "mounted": false,
+         "connections": -3, "hidden": true, "securityType": 4},
+        {"type": "ufs", "volumeName": "u", "name": "other", "mountPoint": "/x", "qaxiState": -2}
+      ],
+      "pendingRescan": {"fileSystems": [], "unresolvedVolumes": [{"volumeName": "p", "impl": false}]},
+      "unresolvedVolumes": [null, {"volumeName": "s", "uuid": "u-1", "lvmUuid": "l", "majorVersion": 5,
+        "capacity": 1, "mountReason": 2, "resignatureReason": 3,
+        "extents": [null, {"deviceName": "e", "partition": 1, "start": -9223372036854775808, "end": 9, "impl": false}]}],
+      "nfsExports": [{"host": "h", "share": "/s", "capacity": 1, "used": 0}],
+      "firewall": {"nfs41Client": []},
+      "heaps": [{"name": "hlfs3", "size": 1, "maxSize": 2}],
+      "pointerBlockCache": {"cacheSize": 1, "cacheSizeMax": 2, "workingSet": 3, "workingSetMax": 4,
+                            "heapOverhead": 5, "capacityMissRatio": 6},
+      "advancedOptions": {"G": {"i": -7, "s": "text"}},
+      "faults": [{"call": "X.Y", "target": "t", "message": "m", "skip": 1, "times": 2}]
+    })");
+    ScopedHost host(original.dump());
+    StorageInfoImpl info;
+    auto big = info.GetFileSystemByLabel("big");
+    EXPECT_EQ(big->GetCapacity(), 18446744073709551615ull);
+    EXPECT_EQ(big->GetUsedSpace(), 9223372036854775809ull);
+    EXPECT_EQ(big->Unmount(Fs::MOUNT_UNTIL_RESTART), 0);
+
+    nlohmann::json expected = original;
+    expected["fileSystems"][0]["mounted"] = false;
+    EXPECT_EQ(host.State(), expected);
+}
+
+TEST(HostState, ChangesAreSeenByTheNextSessionAndByOtherObjects)
+{
+    ScopedHost host(R"({"fileSystems": [{"type": "HLFS", "volumeName": "a", "majorVersion": 3}]})");
+    StorageInfoImpl info;
+    auto first = info.GetFileSystemByLabel("a");
+    auto all = info.GetHlfsFileSystems("");
+    auto* second = all.at(0).get();
+    KnxCtl::Storage::HlFileSystemImpl byPath("/hlfs/volumes/a");
+    byPath.ConvertToVersion5();
+    EXPECT_EQ(second->GetMajorVersion(), 5);
+    EXPECT_EQ(first->Unmount(Fs::MOUNT_PERSISTENT), 0);
+    EXPECT_FALSE(byPath.IsMounted());
+
+    host.Reopen();
+    auto again = StorageInfoImpl().GetHlfsFileSystems("a");
+    ASSERT_EQ(again.size(), 1u);
+    EXPECT_EQ(again[0]->GetMajorVersion(), 5);
+    EXPECT_FALSE(again[0]->IsMounted());
+    EXPECT_EQ(host.State()["fileSystems"][0]["explicitlyUnmounted"], true);
+}
+
+TEST(HostState, DefaultStatePathFollowsTheEnvironment)
+{
+    struct Case {
+        const char* state;
+        const char* xdg;
+        const char* home;
+        std::string expected;
+    };
+    const Case cases[] = {
+        {"/s/host.json", "/x", "/h", "/s/host.json"},
+        {nullptr, "/x", "/h", "/x/autocli/host.json"},
+        {"", "", "/h", "/h/.local/state/autocli/host.json"},
+    };
+    auto set = [](const char* name, const char* value) {
+        if (value)
+            ::setenv(name, value, 1);
+        else
+            ::unsetenv(name);
+    };
+    const std::string savedHome = std::getenv("HOME") ? std::getenv("HOME") : "";
+    for (const auto& c : cases) {
+        set("AUTOCLI_STATE", c.state);
+        set("XDG_STATE_HOME", c.xdg);
+        set("HOME", c.home);
+        EXPECT_EQ(HostSim::DefaultStatePath(), c.expected);
+    }
+    ::unsetenv("AUTOCLI_STATE");
+    ::unsetenv("XDG_STATE_HOME");
+    ::setenv("HOME", savedHome.c_str(), 1);
+}
+
+TEST(HostState, SessionWaitsForTheLockAndThenGivesUp)
+{
+    ScopedHost host("{}");
+    HostSim::CloseSession();
+    int fd = ::open((host.StatePath() + ".lock").c_str(), O_RDWR);
+    ASSERT_GE(fd, 0);
+    ASSERT_EQ(::flock(fd, LOCK_EX), 0);
+    try {
+        HostSim::OpenSession(host.StatePath());
+        ADD_FAILURE() << "the session opened although the lock was held";
+    } catch (const std::runtime_error& e) {
+        EXPECT_NE(std::string(e.what()).find("is in use by another process"), std::string::npos) << e.what();
+    }
+    ::close(fd);
+    HostSim::OpenSession(host.StatePath());
+    EXPECT_NO_THROW(StorageInfoImpl());
+}
+
+} // namespace
