@@ -1,0 +1,325 @@
+// storage hlfs snapshot list / extent list / mount / resignature, run in process against
+// simulated hosts whose unresolved copies are laid out per case.
+
+#include <functional>
+#include <string>
+#include <vector>
+
+#include <gtest/gtest.h>
+#include <nlohmann/json.hpp>
+
+#include "hlfs/HLFSSnapshotList.h"
+#include "hlfs/HLFSSnapshotMount.h"
+#include "support/Cli.h"
+#include "support/HostFixture.h"
+
+using namespace OrvaneCli::FileSystem;
+using nlohmann::json;
+
+namespace {
+
+std::shared_ptr<Input> Args(const std::string& label, const std::string& uuid, bool noPersist = false)
+{
+    auto in = Input::New();
+    if (!label.empty()) {
+        in->SetParameter("volume-label", label);
+    }
+    if (!uuid.empty()) {
+        in->SetParameter("volume-uuid", uuid);
+    }
+    if (noPersist) {
+        in->SetFlag("no-persist");
+    }
+    return in;
+}
+
+std::vector<std::shared_ptr<MetaStruct>> Rows(const TestSupport::CommandResult& result)
+{
+    auto list = std::dynamic_pointer_cast<MetaList>(result.root);
+    EXPECT_TRUE(list) << "no list set";
+    return list ? list->GetElements() : std::vector<std::shared_ptr<MetaStruct>>{};
+}
+
+std::string Str(const std::shared_ptr<MetaStruct>& row, const std::string& field)
+{
+    auto value = std::dynamic_pointer_cast<MetaString>(row->GetField(field));
+    return value ? value->GetValue() : "<not a string>";
+}
+
+long Int(const std::shared_ptr<MetaStruct>& row, const std::string& field)
+{
+    auto value = std::dynamic_pointer_cast<MetaInt>(row->GetField(field));
+    return value ? static_cast<long>(value->GetValue()) : -999;
+}
+
+bool Bool(const std::shared_ptr<MetaStruct>& row, const std::string& field)
+{
+    auto value = std::dynamic_pointer_cast<MetaBool>(row->GetField(field));
+    EXPECT_TRUE(value) << field;
+    return value && value->GetValue();
+}
+
+bool IsTrue(const TestSupport::CommandResult& result)
+{
+    auto value = std::dynamic_pointer_cast<MetaBool>(result.root);
+    return value && value->GetValue();
+}
+
+json Copy(const std::string& name, const std::string& uuid, long mountReason = 0, long resignatureReason = 0)
+{
+    return {{"volumeName", name},
+            {"uuid", uuid},
+            {"lvmUuid", "lvm-" + uuid},
+            {"mountReason", mountReason},
+            {"resignatureReason", resignatureReason},
+            {"extents", json::array({{{"deviceName", "dev-" + uuid}, {"partition", 1}, {"start", 0}, {"end", 99}}})}};
+}
+
+std::string State(const json& unresolved, const json& faults = json::array())
+{
+    return json{{"unresolvedVolumes", unresolved}, {"faults", faults}}.dump();
+}
+
+// Two copies share the label "ds1"; one entry is empty and one of another class.
+json SelectionCopies()
+{
+    json other = Copy("ds1", "u-other");
+    other["impl"] = false;
+    return json::array({Copy("ds1", "u-a"), nullptr, Copy("ds2", "u-b"), other, Copy("ds1", "u-c")});
+}
+
+std::vector<std::string> ListedUuids(const std::string& label, const std::string& uuid)
+{
+    HLFSSnapshotList command;
+    std::vector<std::string> uuids;
+    for (const auto& row : Rows(TestSupport::Execute(command, Args(label, uuid)))) {
+        uuids.push_back(Str(row, "HLFS UUID"));
+    }
+    return uuids;
+}
+
+TEST(HlfsSnapshotTest, SelectionNeedsEveryGivenFilterToMatch)
+{
+    struct Case {
+        std::string label, uuid;
+        std::vector<std::string> expected;
+    };
+    const std::vector<Case> cases = {
+        {"", "", {"u-a", "u-b", "u-c"}},
+        {"ds1", "", {"u-a", "u-c"}},
+        {"", "u-b", {"u-b"}},
+        {"ds1", "u-c", {"u-c"}},
+        {"ds1", "u-b", {}}, // label and UUID of different copies
+        {"DS1", "", {}},    // exact comparison
+        {"", "u-other", {}},
+    };
+    TestSupport::ScopedHost host(State(SelectionCopies()));
+    for (const auto& c : cases) {
+        SCOPED_TRACE("label '" + c.label + "' uuid '" + c.uuid + "'");
+        EXPECT_EQ(ListedUuids(c.label, c.uuid), c.expected);
+    }
+}
+
+TEST(HlfsSnapshotTest, NameIsNotReadWhenTheUuidDiffers)
+{
+    const json faults = json::array(
+        {{{"call", "UnresolvedHlfsVolumeImpl.GetVolumeName"}, {"target", "u-a"}, {"message", "name unreadable"}}});
+    TestSupport::ScopedHost host(State(SelectionCopies(), faults));
+    HLFSSnapshotList command;
+    const auto result = TestSupport::Execute(command, Args("ds1", "u-c"));
+    EXPECT_TRUE(result.errors.empty());
+    ASSERT_EQ(Rows(result).size(), 1u);
+}
+
+TEST(HlfsSnapshotTest, ReasonColumnsFollowTheirOwnCheck)
+{
+    struct Case {
+        long mountReason, resignatureReason;
+        std::string mountText, resignatureText;
+    };
+    const std::vector<Case> cases = {
+        {0, 0, "", ""},
+        {6, 0, "the original volume is still online", ""},
+        {0, 5, "", "the volume is being actively used"},
+        {1, 2, "duplicate extents found", "some extents missing"},
+        {3, 4, "extra extents found", "failed to check for existing active volumes"},
+        {7, 8, "the original volume has some extents online", "unknown error"},
+        {9, 4294967295, "unknown error", "unknown error"},
+    };
+    for (const auto& c : cases) {
+        SCOPED_TRACE(std::to_string(c.mountReason) + "/" + std::to_string(c.resignatureReason));
+        TestSupport::ScopedHost host(State(json::array({Copy("ds1", "u-a", c.mountReason, c.resignatureReason)})));
+        HLFSSnapshotList command;
+        const auto rows = Rows(TestSupport::Execute(command, Args("", "")));
+        ASSERT_EQ(rows.size(), 1u);
+        EXPECT_EQ(Bool(rows[0], "Can mount"), c.mountReason == 0);
+        EXPECT_EQ(Str(rows[0], "Reason for un-mountability"), c.mountText);
+        EXPECT_EQ(Bool(rows[0], "Can resignature"), c.resignatureReason == 0);
+        EXPECT_EQ(Str(rows[0], "Reason for non-resignaturability"), c.resignatureText);
+
+        std::vector<std::pair<bool, bool>> checks;
+        for (const auto& line : host.Journal()) {
+            if (line["call"] == "UnresolvedHlfsVolumeImpl.CanResolve") {
+                checks.emplace_back(line["args"][0].get<bool>(), line["args"][1].get<bool>());
+            }
+        }
+        const std::vector<std::pair<bool, bool>> expected = {{false, true}, {true, false}};
+        EXPECT_EQ(checks, expected);
+    }
+}
+
+// Extents: impl, other class, impl, empty, impl.
+json MixedExtentCopy(const std::string& name, const std::string& uuid)
+{
+    json copy = Copy(name, uuid);
+    json foreign = {{"deviceName", "dev-foreign"}, {"partition", 9}, {"start", 1}, {"end", 2}, {"impl", false}};
+    copy["extents"] = json::array({{{"deviceName", uuid + "-0"}, {"partition", 1}, {"start", 0}, {"end", 10}},
+                                   foreign,
+                                   {{"deviceName", uuid + "-2"}, {"partition", 3}, {"start", 20}, {"end", 30}},
+                                   nullptr,
+                                   {{"deviceName", uuid + "-4"}, {"partition", 255}, {"start", 9007199254740993},
+                                    {"end", -1}}});
+    return copy;
+}
+
+TEST(HlfsSnapshotTest, ExtentNumbersCountSkippedEntries)
+{
+    TestSupport::ScopedHost host(State(json::array({MixedExtentCopy("ds1", "u-a")})));
+    HLFSSnapshotExtentList extents;
+    const auto rows = Rows(TestSupport::Execute(extents, Args("", "")));
+    ASSERT_EQ(rows.size(), 3u);
+    const std::vector<long> numbers = {0, 2, 4};
+    for (std::size_t i = 0; i < rows.size(); ++i) {
+        EXPECT_EQ(Int(rows[i], "Extent Number"), numbers[i]);
+        EXPECT_EQ(Str(rows[i], "Device Name"), "u-a-" + std::to_string(numbers[i]));
+        EXPECT_EQ(Str(rows[i], "LVM UUID"), "lvm-u-a");
+    }
+    EXPECT_EQ(Int(rows[2], "Partition"), 255);
+    EXPECT_EQ(Int(rows[2], "Start"), 9007199254740993L);
+    EXPECT_EQ(Int(rows[2], "End"), -1);
+
+    HLFSSnapshotList list;
+    const auto listed = Rows(TestSupport::Execute(list, Args("", "")));
+    ASSERT_EQ(listed.size(), 1u);
+    EXPECT_EQ(Int(listed[0], "Unresolved Extent Count"), 5);
+}
+
+TEST(HlfsSnapshotTest, HostFailuresKeepTheRowsGatheredSoFar)
+{
+    struct Case {
+        std::string name;
+        std::function<std::shared_ptr<Command>()> make;
+        json fault;
+        std::string label;
+        std::vector<std::string> devices; // rows shown (extent list) or copies (snapshot list)
+    };
+    auto fault = [](const std::string& call, const std::string& target) {
+        return json{{"call", call}, {"target", target}, {"message", "boom"}};
+    };
+    const auto extentList = [] { return HLFSSnapshotExtentList::New(); };
+    const auto snapshotList = [] { return HLFSSnapshotList::New(); };
+    const std::vector<Case> cases = {
+        // One extent fails: the rest of that copy is skipped, the next copy is listed.
+        {"extent row", extentList, fault("DiskLunPartition.GetDeviceName", "u-b-2"), "",
+         {"u-a-0", "u-a-2", "u-a-4", "u-b-0", "u-c-0", "u-c-2", "u-c-4"}},
+        {"volume in row", extentList, fault("UnresolvedHlfsVolumeImpl.GetLvmUuid", "u-b"), "",
+         {"u-a-0", "u-a-2", "u-a-4", "u-c-0", "u-c-2", "u-c-4"}},
+        // A copy's extents cannot be listed: the walk ends.
+        {"extents", extentList, fault("UnresolvedHlfsVolumeImpl.GetExtents", "u-b"), "", {"u-a-0", "u-a-2", "u-a-4"}},
+        {"selection", extentList, fault("UnresolvedHlfsVolumeImpl.GetVolumeName", "u-b"), "ds", {"u-a-0", "u-a-2", "u-a-4"}},
+        {"listing", extentList, fault("StorageInfoImpl.GetUnresolvedVolumes", ""), "", {}},
+        {"check", snapshotList, fault("UnresolvedHlfsVolumeImpl.CanResolve", "u-b"), "", {"u-a"}},
+        {"count", snapshotList, fault("UnresolvedHlfsVolumeImpl.GetExtents", "u-c"), "", {"u-a", "u-b"}},
+    };
+    const json copies =
+        json::array({MixedExtentCopy("ds", "u-a"), MixedExtentCopy("ds", "u-b"), MixedExtentCopy("ds", "u-c")});
+    for (const auto& c : cases) {
+        SCOPED_TRACE(c.name);
+        json f = c.fault;
+        if (f["target"] == "") {
+            f.erase("target");
+        }
+        TestSupport::ScopedHost host(State(copies, json::array({f})));
+        const auto result = TestSupport::Execute(*c.make(), Args(c.label, ""));
+        EXPECT_EQ(result.errors, std::vector<std::string>{"boom"});
+        std::vector<std::string> shown;
+        for (const auto& row : Rows(result)) {
+            shown.push_back(row->HasField("Device Name") ? Str(row, "Device Name") : Str(row, "HLFS UUID"));
+        }
+        EXPECT_EQ(shown, c.devices);
+    }
+}
+
+struct ResolveCase {
+    std::string name;
+    bool resignature;
+    std::string label, uuid;
+    bool noPersist;
+    json copies;
+    std::vector<std::string> errors;
+    std::vector<json> calls; // journal {call, target, args} of the acting calls
+    bool result;
+};
+
+TEST(HlfsSnapshotTest, MountAndResignatureActOnEveryMatchingCopy)
+{
+    const json sameLabel = json::array({Copy("ds1", "u-a"), Copy("ds2", "u-b"), Copy("ds1", "u-c")});
+    const json refused = json::array({Copy("ds1", "u-a", 0, 6), Copy("ds1", "u-c")});
+    const json unmountable = json::array({Copy("ds1", "u-a", 6), Copy("ds1", "u-c")});
+    auto call = [](const std::string& name, const std::string& target, json args) {
+        return json{{"call", name}, {"target", target}, {"args", args}};
+    };
+    const std::vector<ResolveCase> cases = {
+        {"mount both", false, "ds1", "", false, sameLabel, {},
+         {call("Mount", "ds1", {false, true}), call("Mount", "ds1", {false, true})}, true},
+        {"mount no-persist", false, "", "u-b", true, sameLabel, {}, {call("Mount", "ds2", {false, false})}, true},
+        {"mount not found", false, "", "u-x", false, sameLabel,
+         {"No unresolved HLFS snapshots with volume UUID 'u-x' found."}, {}, true},
+        {"mount label not found", false, "nope", "", false, sameLabel,
+         {"No unresolved HLFS snapshots with volume label 'nope' found."}, {}, true},
+        {"mount fails in host", false, "ds1", "", false, unmountable,
+         {"Cannot mount snapshot 'ds1': reason code 6"}, {call("Mount", "ds1", {false, true})}, true},
+        {"both given", false, "ds1", "u-a", false, sameLabel,
+         {"A target snapshot cannot be specified by both volume label and uuid."}, {}, false},
+        {"none given", true, "", "", false, sameLabel,
+         {"A target HLFS volume must be specified by either volume label or uuid but not both."}, {}, false},
+        {"resignature both", true, "ds1", "", false, sameLabel, {},
+         {call("CanResolve", "ds1", {false, false}), call("Resignature", "ds1", json::array()),
+          call("CanResolve", "ds1", {false, false}), call("Resignature", "ds1", json::array())},
+         true},
+        {"resignature refused", true, "ds1", "", false, refused,
+         {"Target snapshot cannot be resignatured: the original volume is still online"},
+         {call("CanResolve", "ds1", {false, false}), call("CanResolve", "ds1", {false, false}),
+          call("Resignature", "ds1", json::array())},
+         true},
+    };
+    for (const auto& c : cases) {
+        SCOPED_TRACE(c.name);
+        TestSupport::ScopedHost host(State(c.copies));
+        std::shared_ptr<Command> command;
+        if (c.resignature) {
+            command = HLFSSnapshotResignature::New();
+        } else {
+            command = HLFSSnapshotMount::New();
+        }
+        const auto result = TestSupport::Execute(*command, Args(c.label, c.uuid, c.noPersist));
+        EXPECT_EQ(result.errors, c.errors);
+        EXPECT_EQ(IsTrue(result), c.result);
+        EXPECT_EQ(result.root != nullptr, c.result);
+
+        std::vector<json> calls;
+        for (const auto& line : host.Journal()) {
+            const std::string name = line["call"];
+            if (name.rfind("UnresolvedHlfsVolumeImpl.", 0) == 0) {
+                json args = line["args"];
+                if (name.ends_with(".CanResolve")) {
+                    args = json::array({args[0], args[1]});
+                }
+                calls.push_back(call(name.substr(name.find('.') + 1), line["target"], args));
+            }
+        }
+        EXPECT_EQ(calls, c.calls);
+    }
+}
+
+} // namespace
