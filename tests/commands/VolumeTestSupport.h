@@ -56,7 +56,7 @@ inline Texts Rows(const std::shared_ptr<Quillets::MetaObj::MetaObject>& root, co
     return rows;
 }
 
-// The journal in short: "Call target" per host call, "notify Event:stdin" per script run.
+// The journal in short: "Call target" per volume call, "Call" per storage-wide one, "notify Event:stdin" per script run.
 inline Texts Trace(const TestSupport::ScopedHost& host)
 {
     static const std::regex event(" -t (\\S+) ");
@@ -65,7 +65,8 @@ inline Texts Trace(const TestSupport::ScopedHost& host)
         const std::string call = line.value("call", ""), target = line.value("target", "");
         std::smatch m;
         if (call != "AutoCli_ShellCmd") {
-            trace.push_back(target.empty() ? call : call + " " + target);
+            // Storage-wide calls are named without a target.
+            trace.push_back(target.empty() || call.rfind("StorageInfoImpl.", 0) == 0 ? call : call + " " + target);
         } else if (const std::string command = line["args"][0]; std::regex_search(command, m, event)) {
             trace.push_back("notify " + m[1].str() + ":" + line["args"][1].get<std::string>());
         }
