@@ -408,7 +408,7 @@ std::string DumpState()
     const Model::State& state = Runtime::CheckedState();
     std::ostringstream out;
     Model::Write(state, out);
-    return out.str();
+    return std::move(out).str(); // hands over the buffer: a large state is not copied again
 }
 
 } // namespace HostSim
