@@ -1,5 +1,6 @@
-// storage hlfs host list: the status of each host against the volume's locking mode, and
-// the liveness check handed to the host.
+// storage hlfs host list in process: the status of each host against the volume's locking
+// mode, and no partial list after a host failure. Rows, the liveness check and the table
+// are covered by the hlfs-host fixture cases.
 
 #include <string>
 #include <vector>
@@ -43,76 +44,11 @@ TEST(HlfsHostListTest, StatusByVolumeModeAndHostMode)
     }
 }
 
-json User(const std::string& id, int lockModeInUse, bool live)
+std::string State(const json& faults)
 {
-    return {{"heartbeatUuid", id},       {"macAddress", "00:50:56:AB:0c:01"}, {"driverVersionMajor", 14},
-            {"driverVersionMinor", 61}, {"heartbeatOffset", 3145728},      {"lockModeInUse", lockModeInUse},
-            {"live", live}};
-}
-
-std::string State(const json& faults = json::array())
-{
-    json volume = {{"type", "HLFS"},
-                   {"volumeName", "ds1"},
-                   {"uuid", "uuid-ds1"},
-                   {"lockMode", 0x10},
-                   {"users", json::array({User("hb-a", 4, true), User("hb-b", 6, false), User("hb-c", 0, true)})}};
+    const json user = {{"heartbeatUuid", "hb-a"}, {"lockModeInUse", 4}};
+    const json volume = {{"type", "HLFS"}, {"volumeName", "ds1"}, {"lockMode", 0x10}, {"users", json::array({user, user})}};
     return json{{"fileSystems", json::array({volume})}, {"faults", faults}}.dump();
-}
-
-std::vector<std::vector<std::string>> Table(const TestSupport::CommandResult& result)
-{
-    std::vector<std::vector<std::string>> table;
-    auto list = std::dynamic_pointer_cast<MetaList>(result.root);
-    if (!list) {
-        return table;
-    }
-    for (const auto& row : list->GetElements()) {
-        std::vector<std::string> cells;
-        for (const auto& [name, value] : row->GetFields()) {
-            if (auto s = std::dynamic_pointer_cast<MetaString>(value)) {
-                cells.push_back(s->GetValue());
-            } else if (auto i = std::dynamic_pointer_cast<MetaInt>(value)) {
-                cells.push_back(std::to_string(i->GetValue()));
-            }
-        }
-        table.push_back(cells);
-    }
-    return table;
-}
-
-TEST(HlfsHostListTest, LivenessCheckIsPassedToTheHost)
-{
-    const std::vector<std::string> a = {"hb-a", "00:50:56:ab:0c:01", "14.61", "3145728", "ATS-only", kNormal};
-    const std::vector<std::string> b = {"hb-b", "00:50:56:ab:0c:01", "14.61", "3145728", "ATS+SCSI", kNormal};
-    const std::vector<std::string> c = {"hb-c", "00:50:56:ab:0c:01", "14.61", "3145728", "ATS+SCSI", kInvalid};
-    struct Case {
-        std::string liveness;
-        bool quick;
-        std::vector<std::vector<std::string>> rows;
-    };
-    const std::vector<Case> cases = {
-        {"", false, {a, b, c}},
-        {"none", false, {a, b, c}},
-        {"quick", true, {a, c}},
-    };
-    for (const auto& k : cases) {
-        SCOPED_TRACE("liveness '" + k.liveness + "'");
-        TestSupport::ScopedHost host(State());
-        auto in = Input::New();
-        in->SetParameter("volume-uuid", "uuid-ds1");
-        if (!k.liveness.empty()) {
-            in->SetParameter("liveness", k.liveness);
-        }
-        HLFSVolumeHostList command;
-        const auto result = TestSupport::Execute(command, in);
-        EXPECT_TRUE(result.errors.empty());
-        EXPECT_EQ(Table(result), k.rows);
-        const auto journal = host.Journal();
-        ASSERT_EQ(journal.size(), 1u);
-        EXPECT_EQ(journal[0]["call"], "HlFileSystem.GetUsers");
-        EXPECT_EQ(journal[0]["args"], json::array({k.quick}));
-    }
 }
 
 TEST(HlfsHostListTest, HostFailureShowsNoPartialList)
