@@ -120,6 +120,16 @@ TEST(Render, ControlCharactersCannotBreakHumanReadableLines)
     EXPECT_EQ(Render(row, "csv"), "Text\n\"two\nlines\t\x1b\"\n");
 }
 
+TEST(Render, EmptyValuesKeepTheSimpleLineShape)
+{
+    auto row = MetaStruct::New("S");
+    row->SetField("Empty", "");
+    row->SetField("Last", "");
+    EXPECT_EQ(Render(row, "simple"), "   Empty: \n   Last: \n");
+    // Table lines never end in padding.
+    EXPECT_EQ(Render(row, "table"), "Empty  Last\n-----  ----\n\n");
+}
+
 TEST(Render, TableWidthCountsCharactersNotBytes)
 {
     auto list = MetaList::New(MetaType::Struct, nullptr);
