@@ -416,9 +416,11 @@ bool StorageInfoImpl::TryMount(FileSystem::MountOperationOption option, const st
         for (auto& fs : st.fileSystems) {
             if ((!uuid.empty() && fs.uuid != uuid) || (!label.empty() && fs.volumeName != label))
                 continue;
-            journal.target = fs.volumeName;
+            if (journal.target.empty() || journal.target == label)
+                journal.target = fs.volumeName;
             if (fs.mounted)
-                return false;
+                continue; // another volume may match too
+            journal.target = fs.volumeName;
             fs.mounted = true;
             fs.Mark(FsKey::mounted);
             if (fs.explicitlyUnmounted) {
