@@ -9,6 +9,7 @@
 
 #include <gtest/gtest.h>
 
+#include "quillets/QuilletException.h"
 #include "registration/Registration.h"
 #include "support/HostFixture.h"
 
@@ -79,7 +80,8 @@ std::vector<std::string> Problems(Command& command)
     static const std::regex parameterName("[a-z0-9]+(-[a-z0-9]+)*");
     std::set<std::string> longNames;
     std::set<std::string> shortNames;
-    for (const auto& parameter : command.GetInputSpec()->GetParameters()) {
+    const auto input = command.GetInputSpec();
+    for (const auto& parameter : input->GetParameters()) {
         const std::string& name = parameter->GetName();
         if (!std::regex_match(name, parameterName)) {
             problems.push_back("parameter name '" + name + "' is not lower-case words joined by hyphens");

@@ -8,6 +8,7 @@
 
 #include <gtest/gtest.h>
 
+#include "quillets/QuilletException.h"
 #include "registration/Registration.h"
 #include "support/HostFixture.h"
 
@@ -88,7 +89,7 @@ protected:
 
 TEST_F(RegistrationTest, RootWithoutStorageIsRefusedWithTheRootsName)
 {
-    for (const std::string& rootName : {"root", "cli"}) {
+    for (const std::string rootName : {"root", "cli"}) {
         auto root = Namespace::New();
         root->SetName(rootName);
         root->RegisterNamespaceNode(Namespace::New(), "network");
@@ -172,9 +173,10 @@ TEST(RegistrationSwitchTest, PreunmountStateFollowsItsSwitch)
         TestSupport::ScopedHost host(on ? R"({"features": {"270": true}})" : R"({"features": {"270": false}})");
         auto storage = Namespace::New();
         FilesystemNfs_RegisterNamespaces(storage);
-        EXPECT_EQ(ChildNames(Child(storage, "nfs")),
-                  on ? std::vector<std::string>{"add", "remove", "list", "preunmountstate", "param", "firewall"}
-                     : std::vector<std::string>{"add", "remove", "list", "param", "firewall"});
+        const std::vector<std::string> expected =
+            on ? std::vector<std::string>{"add", "remove", "list", "preunmountstate", "param", "firewall"}
+               : std::vector<std::string>{"add", "remove", "list", "param", "firewall"};
+        EXPECT_EQ(ChildNames(Child(storage, "nfs")), expected);
     }
 }
 
