@@ -1,6 +1,9 @@
 #include "HostObjects.h"
 
 #include <algorithm>
+#include <array>
+#include <cstdio>
+#include <functional>
 
 namespace HostSim::Objects {
 
@@ -89,14 +92,30 @@ FileSystemRecord& AdoptCopy(UnresolvedVolume& copy, const std::string& uuid, con
 
 } // namespace
 
+namespace {
+// The record's place in `list` when it is one of its elements (a hint for later look-ups).
+template <typename Record>
+std::size_t PlaceIn(const std::vector<Record>& list, const Record& record)
+{
+    std::less<const Record*> before;
+    if (list.empty() || before(&record, list.data()) || !before(&record, list.data() + list.size()))
+        return static_cast<std::size_t>(-1);
+    return static_cast<std::size_t>(&record - list.data());
+}
+} // namespace
+
 HandlePtr MakeHandle(const FileSystemRecord& record)
 {
-    return std::make_shared<Handle>(Handle{Handle::Kind::FileSystem, record.id, -1, record.volumeName});
+    auto handle = std::make_shared<Handle>(Handle{Handle::Kind::FileSystem, record.id, -1, record.volumeName});
+    handle->position = PlaceIn(Runtime::CheckedState().fileSystems, record);
+    return handle;
 }
 
 HandlePtr MakeHandle(const UnresolvedVolume& record)
 {
-    return std::make_shared<Handle>(Handle{Handle::Kind::Unresolved, record.id, -1, record.volumeName});
+    auto handle = std::make_shared<Handle>(Handle{Handle::Kind::Unresolved, record.id, -1, record.volumeName});
+    handle->position = PlaceIn(Runtime::CheckedState().unresolvedVolumes, record);
+    return handle;
 }
 
 std::unique_ptr<FileSystem> MakeFileSystem(const FileSystemRecord& record)
@@ -135,7 +154,7 @@ std::unique_ptr<HostCtl::Storage::UnresolvedHlfsVolume> MakeUnresolved(const Unr
 FileSystemRecord& Resolve(const Handle& handle)
 {
     Runtime::CheckedState();
-    FileSystemRecord* record = Runtime::FindFileSystemById(handle.id);
+    FileSystemRecord* record = Runtime::FindFileSystemById(handle.id, handle.position);
     if (!record)
         Runtime::Throw("Volume '" + handle.name + "' no longer exists");
     return *record;
@@ -144,7 +163,7 @@ FileSystemRecord& Resolve(const Handle& handle)
 UnresolvedVolume& ResolveUnresolved(const Handle& handle)
 {
     Runtime::CheckedState();
-    UnresolvedVolume* record = Runtime::FindUnresolvedById(handle.id);
+    UnresolvedVolume* record = Runtime::FindUnresolvedById(handle.id, handle.position);
     if (!record)
         Runtime::Throw("Snapshot '" + handle.name + "' no longer exists");
     return *record;

@@ -20,6 +20,7 @@ struct HostObjectHandle {
     std::uint64_t id = 0;
     int extent = -1;  // for extent objects: the extent's position in its volume
     std::string name; // the volume's name when the object was made: journal target and messages
+    mutable std::size_t position = static_cast<std::size_t>(-1); // where the volume was last seen
 };
 
 } // namespace KnxCtl::Storage

@@ -35,8 +35,9 @@ void CheckFault(std::string_view call, std::initializer_list<std::string_view> t
 void MarkDirty();
 
 // Look-ups in the state; positions are indexes into fileSystems.
-FileSystemRecord* FindFileSystemById(std::uint64_t id);
-UnresolvedVolume* FindUnresolvedById(std::uint64_t id);
+// `position` is a hint where to look first; it is updated to where the record was found.
+FileSystemRecord* FindFileSystemById(std::uint64_t id, std::size_t& position);
+UnresolvedVolume* FindUnresolvedById(std::uint64_t id, std::size_t& position);
 const FileSystemRecord* FirstByUuid(std::string_view uuid);
 const FileSystemRecord* FirstByVolumeName(std::string_view name);
 const FileSystemRecord* FirstMountedByPath(std::string_view path);

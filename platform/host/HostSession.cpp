@@ -247,20 +247,31 @@ void MarkDirty()
     gSession.dirty = true;
 }
 
-FileSystemRecord* FindFileSystemById(std::uint64_t id)
+namespace {
+// Records are kept in id order, so a binary search finds any of them; objects remember
+// where their record was, which makes the usual look-up a single comparison.
+template <typename Record>
+Record* FindById(std::vector<Record>& list, std::uint64_t id, std::size_t& position)
 {
-    auto& list = gSession.state.fileSystems;
+    if (position < list.size() && list[position].id == id)
+        return &list[position];
     auto it = std::lower_bound(list.begin(), list.end(), id,
-                               [](const FileSystemRecord& r, std::uint64_t key) { return r.id < key; });
-    return it != list.end() && it->id == id ? &*it : nullptr;
+                               [](const Record& r, std::uint64_t key) { return r.id < key; });
+    if (it == list.end() || it->id != id)
+        return nullptr;
+    position = static_cast<std::size_t>(it - list.begin());
+    return &*it;
+}
+} // namespace
+
+FileSystemRecord* FindFileSystemById(std::uint64_t id, std::size_t& position)
+{
+    return FindById(gSession.state.fileSystems, id, position);
 }
 
-UnresolvedVolume* FindUnresolvedById(std::uint64_t id)
+UnresolvedVolume* FindUnresolvedById(std::uint64_t id, std::size_t& position)
 {
-    auto& list = gSession.state.unresolvedVolumes;
-    auto it = std::lower_bound(list.begin(), list.end(), id,
-                               [](const UnresolvedVolume& r, std::uint64_t key) { return r.id < key; });
-    return it != list.end() && it->id == id ? &*it : nullptr;
+    return FindById(gSession.state.unresolvedVolumes, id, position);
 }
 
 const FileSystemRecord* FirstByUuid(std::string_view uuid)
