@@ -15,8 +15,18 @@ constexpr const char* kConnections = "connections";
 constexpr const char* kHostKnxnic = "host-knxnic";
 constexpr const char* kAllVolumes = "all";
 
-using VolumeQuery = std::vector<std::unique_ptr<NetworkFileSystem>> (StorageInfoImpl::*)(
-    StorageInfoImpl::NetworkFileSystemFilter);
+// The non-PE volumes of one NFS version.
+using VolumeQuery = std::vector<std::unique_ptr<NetworkFileSystem>> (*)(StorageInfoImpl&);
+
+std::vector<std::unique_ptr<NetworkFileSystem>> NonPEV3Volumes(StorageInfoImpl& storage)
+{
+    return storage.GetV3NetworkFileSystems(&StorageInfoImpl::IsNotPE);
+}
+
+std::vector<std::unique_ptr<NetworkFileSystem>> NonPEV41Volumes(StorageInfoImpl& storage)
+{
+    return storage.GetV41NetworkFileSystems(&StorageInfoImpl::IsNotPE);
+}
 
 struct V3ParamFeatures {
     bool knxnic = IsFeatureEnabled(Feature::NfsKnxnicBinding);
@@ -69,7 +79,7 @@ void ListVolumeParams(const std::string& name, VolumeQuery query, const OutputPt
     const bool all = name == kAllVolumes;
     auto rows = MetaList::New(MetaType::Struct, makeRow());
     WithStorageInfo(StorageInfoPlacement::InsideGuard, out, [&](StorageInfoImpl& storage) {
-        const auto volumes = (storage.*query)(&StorageInfoImpl::IsNotPE);
+        const auto volumes = query(storage);
         for (const auto& volume : volumes) {
             const std::string volumeName = volume->GetVolumeName();
             if (!all && volumeName != name) {
@@ -102,7 +112,7 @@ void SetVolumeParams(const std::string& name, VolumeQuery query, const char* kin
                      Apply&& apply)
 {
     WithStorageInfo(StorageInfoPlacement::InsideGuard, out, [&](StorageInfoImpl& storage) {
-        const auto volumes = (storage.*query)(&StorageInfoImpl::IsNotPE);
+        const auto volumes = query(storage);
         bool found = false;
         for (const auto& volume : volumes) {
             if (volume->GetVolumeName() != name) {
@@ -170,7 +180,7 @@ void NFSVolumeParamGet::ExecuteInternal(const InputPtr& in, const OutputPtr& out
 {
     const V3ParamFeatures features;
     ListVolumeParams(
-        in->GetParameter(kVolumeName), &StorageInfoImpl::GetV3NetworkFileSystems, out,
+        in->GetParameter(kVolumeName), NonPEV3Volumes, out,
         [&] { return MakeV3ParamRow(features); },
         [&](NetworkFileSystem& volume, MetaStruct& row) {
             if (features.knxnic) {
@@ -219,7 +229,7 @@ void NFSVolumeParamSet::ExecuteInternal(const InputPtr& in, const OutputPtr& out
     const std::string& knxnic = in->GetParameter(kKnxnic);
     const bool setKnxnic = features.knxnic && IsGiven(knxnic);
     const bool setConnections = features.connections && in->HasParameter(kConnections);
-    SetVolumeParams(in->GetParameter(kVolumeName), &StorageInfoImpl::GetV3NetworkFileSystems, "NAS", out,
+    SetVolumeParams(in->GetParameter(kVolumeName), NonPEV3Volumes, "NAS", out,
                     [&](NetworkFileSystem& volume) {
                         ApplyMaxQueueDepth(in, volume);
                         if (setKnxnic) {
@@ -270,7 +280,7 @@ void NFS41VolumeParamGet::ExecuteInternal(const InputPtr& in, const OutputPtr& o
 {
     const bool knxnics = IsFeatureEnabled(Feature::Nfs41KnxnicBinding);
     ListVolumeParams(
-        in->GetParameter(kVolumeName), &StorageInfoImpl::GetV41NetworkFileSystems, out,
+        in->GetParameter(kVolumeName), NonPEV41Volumes, out,
         [&] { return MakeV41ParamRow(knxnics); },
         [&](NetworkFileSystem& volume, MetaStruct& row) {
             if (knxnics) {
@@ -311,7 +321,7 @@ void NFS41VolumeParamSet::ExecuteInternal(const InputPtr& in, const OutputPtr& o
         in->GetParameterList(kHostKnxnic, hostKnxnics);
     }
     const std::string knxnics = JoinWithCommas(hostKnxnics);
-    SetVolumeParams(in->GetParameter(kVolumeName), &StorageInfoImpl::GetV41NetworkFileSystems, "NFS v4.1", out,
+    SetVolumeParams(in->GetParameter(kVolumeName), NonPEV41Volumes, "NFS v4.1", out,
                     [&](NetworkFileSystem& volume) {
                         ApplyMaxQueueDepth(in, volume);
                         if (!hostKnxnics.empty()) {
