@@ -24,9 +24,9 @@ std::shared_ptr<ParameterSpec> MakeParameter(const ParameterDecl& decl)
     return parameter;
 }
 
-void AddParameter(const std::shared_ptr<InputSpec>& spec, const ParameterDecl& decl)
+void AddParameter(const std::shared_ptr<InputSpec>& inputs, const ParameterDecl& decl)
 {
-    spec->AddParameter(MakeParameter(decl));
+    inputs->AddParameter(MakeParameter(decl));
 }
 
 std::shared_ptr<ParameterConstraint> IntRange(long min, long max)
@@ -51,23 +51,23 @@ std::shared_ptr<ParameterConstraint> StringEnum(std::initializer_list<std::pair<
 
 std::shared_ptr<OutputSpec> BooleanOutputSpec()
 {
-    auto spec = OutputSpec::New();
-    spec->SetRootObject(MetaBool::New());
-    return spec;
+    auto outputs = OutputSpec::New();
+    outputs->SetRootObject(MetaBool::New());
+    return outputs;
 }
 
 std::shared_ptr<OutputSpec> ListOutputSpec(std::shared_ptr<MetaStruct> prototype)
 {
-    auto spec = OutputSpec::New();
-    spec->SetRootObject(MetaList::New(MetaType::Struct, std::move(prototype)));
-    return spec;
+    auto outputs = OutputSpec::New();
+    outputs->SetRootObject(MetaList::New(MetaType::Struct, std::move(prototype)));
+    return outputs;
 }
 
 std::shared_ptr<OutputSpec> StructOutputSpec(std::shared_ptr<MetaStruct> structure)
 {
-    auto spec = OutputSpec::New();
-    spec->SetRootObject(std::move(structure));
-    return spec;
+    auto outputs = OutputSpec::New();
+    outputs->SetRootObject(std::move(structure));
+    return outputs;
 }
 
 } // namespace OrvaneCli::FileSystem

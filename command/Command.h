@@ -68,16 +68,16 @@ struct ParameterDecl {
 };
 
 std::shared_ptr<ParameterSpec> MakeParameter(const ParameterDecl& decl);
-void AddParameter(const std::shared_ptr<InputSpec>& spec, const ParameterDecl& decl);
+void AddParameter(const std::shared_ptr<InputSpec>& inputs, const ParameterDecl& decl);
 std::shared_ptr<ParameterConstraint> IntRange(long min, long max);
 // Allowed values, each with its description ("" adds the value without one).
 std::shared_ptr<ParameterConstraint> StringEnum(std::initializer_list<std::pair<const char*, const char*>> values);
 
-// Output specification whose root is an empty boolean (action commands).
+// Output description whose root is an empty boolean (action commands).
 std::shared_ptr<OutputSpec> BooleanOutputSpec();
-// Output specification whose root is a list of `prototype`-shaped rows.
+// Output description whose root is a list of `prototype`-shaped rows.
 std::shared_ptr<OutputSpec> ListOutputSpec(std::shared_ptr<MetaStruct> prototype);
-// Output specification whose root is one structure.
+// Output description whose root is one structure.
 std::shared_ptr<OutputSpec> StructOutputSpec(std::shared_ptr<MetaStruct> structure);
 
 // The guarded region: runs `body`; a HostCtlException leaving it becomes exactly one

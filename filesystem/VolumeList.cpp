@@ -33,11 +33,11 @@ VolumeList::~VolumeList() = default;
 
 std::shared_ptr<InputSpec> VolumeList::GetInputSpecInternal()
 {
-    auto spec = InputSpec::New();
-    AddParameter(spec, {kUuidParameter, "u", ParameterType::String,
+    auto inputs = InputSpec::New();
+    AddParameter(inputs, {kUuidParameter, "u", ParameterType::String,
                         "Only show information for the filesystem with the specified UUID."});
-    spec->AddParameter(IgnoreErrorInputParameter());
-    return spec;
+    inputs->AddParameter(IgnoreErrorInputParameter());
+    return inputs;
 }
 
 std::shared_ptr<OutputSpec> VolumeList::GetOutputSpecInternal() { return ListOutputSpec(GetOutputStructure()); }

@@ -165,16 +165,16 @@ VolumeMount::~VolumeMount() = default;
 
 std::shared_ptr<InputSpec> VolumeMount::GetInputSpecInternal()
 {
-    auto spec = InputSpec::New();
-    AddParameter(spec, {kVolumeLabel, "l", ParameterType::String,
+    auto inputs = InputSpec::New();
+    AddParameter(inputs, {kVolumeLabel, "l", ParameterType::String,
                         "The label of the volume to mount. This volume must be unmounted for this operation to "
                         "succeed."});
-    AddParameter(spec, {kVolumeUuid, "u", ParameterType::String,
+    AddParameter(inputs, {kVolumeUuid, "u", ParameterType::String,
                         "The UUID of the HLFS filesystem to mount. This volume must be unmounted for this operation "
                         "to succeed."});
-    AddParameter(spec, {kNoPersist, "n", ParameterType::Flag,
+    AddParameter(inputs, {kNoPersist, "n", ParameterType::Flag,
                         "Mount the volume non-persistently; the volume will not be mounted after a restart."});
-    return spec;
+    return inputs;
 }
 
 std::shared_ptr<OutputSpec> VolumeMount::GetOutputSpecInternal() { return BooleanOutputSpec(); }
@@ -241,14 +241,14 @@ VolumeUnmount::~VolumeUnmount() = default;
 
 std::shared_ptr<InputSpec> VolumeUnmount::GetInputSpecInternal()
 {
-    auto spec = InputSpec::New();
-    AddParameter(spec, {kVolumeLabel, "l", ParameterType::String, "The label of the volume to unmount."});
-    AddParameter(spec, {kVolumePath, "p", ParameterType::String, "The path of the volume to unmount."});
-    AddParameter(spec, {kVolumeUuid, "u", ParameterType::String, "The uuid of the volume to unmount."});
-    AddParameter(spec, {kNoPersist, "n", ParameterType::Flag,
+    auto inputs = InputSpec::New();
+    AddParameter(inputs, {kVolumeLabel, "l", ParameterType::String, "The label of the volume to unmount."});
+    AddParameter(inputs, {kVolumePath, "p", ParameterType::String, "The path of the volume to unmount."});
+    AddParameter(inputs, {kVolumeUuid, "u", ParameterType::String, "The uuid of the volume to unmount."});
+    AddParameter(inputs, {kNoPersist, "n", ParameterType::Flag,
                         "Unmount the volume non-persistently; the volume will be automounted after a restart."});
-    AddParameter(spec, {kUnmountAllHlfs, "a", ParameterType::Flag, "Unmount all hlfs volumes."});
-    return spec;
+    AddParameter(inputs, {kUnmountAllHlfs, "a", ParameterType::Flag, "Unmount all hlfs volumes."});
+    return inputs;
 }
 
 std::shared_ptr<OutputSpec> VolumeUnmount::GetOutputSpecInternal() { return BooleanOutputSpec(); }

@@ -31,9 +31,9 @@ HLFSExtentList::~HLFSExtentList() = default;
 
 std::shared_ptr<InputSpec> HLFSExtentList::GetInputSpecInternal()
 {
-    auto spec = InputSpec::New();
-    spec->AddParameter(IgnoreErrorInputParameter());
-    return spec;
+    auto inputs = InputSpec::New();
+    inputs->AddParameter(IgnoreErrorInputParameter());
+    return inputs;
 }
 
 std::shared_ptr<OutputSpec> HLFSExtentList::GetOutputSpecInternal() { return ListOutputSpec(GetOutputStructure()); }

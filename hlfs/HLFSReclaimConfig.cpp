@@ -93,17 +93,17 @@ HLFSReclaimConfigSet::~HLFSReclaimConfigSet() = default;
 
 std::shared_ptr<InputSpec> HLFSReclaimConfigSet::GetInputSpecInternal()
 {
-    auto spec = GetSingleHLFSVolumeInputSpec();
-    AddParameter(spec, {kGranularityParameter, "g", ParameterType::Int,
+    auto inputs = GetSingleHLFSVolumeInputSpec();
+    AddParameter(inputs, {kGranularityParameter, "g", ParameterType::Int,
                         "Minimum granularity of automatic space reclamation in bytes"});
-    AddParameter(spec, {kPriorityParameter, "p", ParameterType::String,
+    AddParameter(inputs, {kPriorityParameter, "p", ParameterType::String,
                         "Priority of automatic space reclamation. Supported options are %ENUM%.", false,
                         StringEnum({{"none", ""}, {"low", ""}, {"medium", ""}, {"high", ""}})});
-    AddParameter(spec, {kMethodParameter, "m", ParameterType::String,
+    AddParameter(inputs, {kMethodParameter, "m", ParameterType::String,
                         "Method of automatic space reclamation.  Supported options are %ENUM%.", false,
                         StringEnum({{kMethodPriority, ""}, {kMethodFixed, ""}})});
-    AddParameter(spec, {kBandwidthParameter, "b", ParameterType::Int, "Space reclamation fixed bandwidth (MB/s)"});
-    return spec;
+    AddParameter(inputs, {kBandwidthParameter, "b", ParameterType::Int, "Space reclamation fixed bandwidth (MB/s)"});
+    return inputs;
 }
 
 std::shared_ptr<OutputSpec> HLFSReclaimConfigSet::GetOutputSpecInternal() { return BooleanOutputSpec(); }

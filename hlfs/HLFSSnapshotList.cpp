@@ -33,10 +33,10 @@ HLFSSnapshotList::~HLFSSnapshotList() = default;
 
 std::shared_ptr<InputSpec> HLFSSnapshotList::GetInputSpecInternal()
 {
-    auto spec = InputSpec::New();
-    AddSnapshotSelectionParameters(spec, "The HLFS volume label of the snapshot to list.",
+    auto inputs = InputSpec::New();
+    AddSnapshotSelectionParameters(inputs, "The HLFS volume label of the snapshot to list.",
                                    "The HLFS volume uuid of the snapshot to list.");
-    return spec;
+    return inputs;
 }
 
 std::shared_ptr<OutputSpec> HLFSSnapshotList::GetOutputSpecInternal() { return ListOutputSpec(GetOutputStructure()); }
@@ -105,10 +105,10 @@ HLFSSnapshotExtentList::~HLFSSnapshotExtentList() = default;
 
 std::shared_ptr<InputSpec> HLFSSnapshotExtentList::GetInputSpecInternal()
 {
-    auto spec = InputSpec::New();
-    AddSnapshotSelectionParameters(spec, "The HLFS volume label of the target snapshot to enumerate.",
+    auto inputs = InputSpec::New();
+    AddSnapshotSelectionParameters(inputs, "The HLFS volume label of the target snapshot to enumerate.",
                                    "The HLFS volume uuid of the target snapshot to enumerate.");
-    return spec;
+    return inputs;
 }
 
 std::shared_ptr<OutputSpec> HLFSSnapshotExtentList::GetOutputSpecInternal()

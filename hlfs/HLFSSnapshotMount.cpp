@@ -57,12 +57,12 @@ HLFSSnapshotMount::~HLFSSnapshotMount() = default;
 
 std::shared_ptr<InputSpec> HLFSSnapshotMount::GetInputSpecInternal()
 {
-    auto spec = InputSpec::New();
-    AddSnapshotSelectionParameters(spec, "The HLFS volume label of the snapshot to mount.",
+    auto inputs = InputSpec::New();
+    AddSnapshotSelectionParameters(inputs, "The HLFS volume label of the snapshot to mount.",
                                    "The HLFS volume uuid of the snapshot to mount.");
-    AddParameter(spec, {"no-persist", "n", ParameterType::Flag,
+    AddParameter(inputs, {"no-persist", "n", ParameterType::Flag,
                         "Mount the volume non-persistently; the volume will not be automounted after a restart."});
-    return spec;
+    return inputs;
 }
 
 std::shared_ptr<OutputSpec> HLFSSnapshotMount::GetOutputSpecInternal() { return BooleanOutputSpec(); }
@@ -88,10 +88,10 @@ HLFSSnapshotResignature::~HLFSSnapshotResignature() = default;
 
 std::shared_ptr<InputSpec> HLFSSnapshotResignature::GetInputSpecInternal()
 {
-    auto spec = InputSpec::New();
-    AddSnapshotSelectionParameters(spec, "The HLFS volume label of the snapshot to resignature.",
+    auto inputs = InputSpec::New();
+    AddSnapshotSelectionParameters(inputs, "The HLFS volume label of the snapshot to resignature.",
                                    "The HLFS volume uuid of the snapshot to resignature.");
-    return spec;
+    return inputs;
 }
 
 std::shared_ptr<OutputSpec> HLFSSnapshotResignature::GetOutputSpecInternal() { return BooleanOutputSpec(); }

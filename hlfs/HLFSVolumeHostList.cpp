@@ -35,14 +35,14 @@ std::shared_ptr<InputSpec> HLFSVolumeHostList::GetInputSpecInternal()
 {
     AddExample("-l datastore1", "List hosts using volume 'datastore1' with default liveness check of 'none'.");
     AddExample("-l datastore1 -v quick", "List hosts using volume 'datastore1' with liveness check of 'quick'.");
-    auto spec = GetSingleHLFSVolumeInputSpec();
-    AddParameter(spec, {"liveness", "v", ParameterType::String,
+    auto inputs = GetSingleHLFSVolumeInputSpec();
+    AddParameter(inputs, {"liveness", "v", ParameterType::String,
                         "The type of liveness check to perform on the HLFS volume. Valid values are %ENUM% (default "
                         "is none).",
                         false,
                         StringEnum({{"none", "No liveness check, just scan heartbeats (default)"},
                                     {"quick", "Quick liveness check, wait for one heartbeat interval"}})});
-    return spec;
+    return inputs;
 }
 
 std::shared_ptr<OutputSpec> HLFSVolumeHostList::GetOutputSpecInternal() { return ListOutputSpec(GetOutputStructure()); }

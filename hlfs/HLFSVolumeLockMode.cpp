@@ -184,10 +184,10 @@ std::shared_ptr<InputSpec> HLFSVolumeLockModeSet::GetInputSpecInternal()
     AddExample("-a -l datastore1", "Configure HLFS volume with label 'datastore1'for ATS-only locking.");
     AddExample("-s -u 50ac1b12-6b9eebe0-6765-80c16e6d3408",
                "Configure HLFS volume with uuid '50ac1b12-6b9eebe0-6765-80c16e6d3408' for SCSI locking.");
-    auto spec = GetSingleHLFSVolumeInputSpec();
-    AddParameter(spec, {"ats", "a", ParameterType::Flag, "Enable ATS-only locking."});
-    AddParameter(spec, {"scsi", "s", ParameterType::Flag, "Enable SCSI locking."});
-    return spec;
+    auto inputs = GetSingleHLFSVolumeInputSpec();
+    AddParameter(inputs, {"ats", "a", ParameterType::Flag, "Enable ATS-only locking."});
+    AddParameter(inputs, {"scsi", "s", ParameterType::Flag, "Enable SCSI locking."});
+    return inputs;
 }
 
 std::shared_ptr<OutputSpec> HLFSVolumeLockModeSet::GetOutputSpecInternal() { return BooleanOutputSpec(); }

@@ -19,10 +19,10 @@ constexpr std::int64_t kMaxReclaimUnit = std::numeric_limits<std::uint32_t>::max
 
 std::shared_ptr<InputSpec> VolumeChoiceInputSpec(const char* labelDescription, const char* uuidDescription)
 {
-    auto spec = InputSpec::New();
-    AddParameter(spec, {kLabelParameter, "l", ParameterType::String, labelDescription});
-    AddParameter(spec, {kUuidParameter, "u", ParameterType::String, uuidDescription});
-    return spec;
+    auto inputs = InputSpec::New();
+    AddParameter(inputs, {kLabelParameter, "l", ParameterType::String, labelDescription});
+    AddParameter(inputs, {kUuidParameter, "u", ParameterType::String, uuidDescription});
+    return inputs;
 }
 
 // The identifier (label or UUID, as typed) of the volume the user chose, after checking
@@ -96,11 +96,11 @@ HLFSVolumeUnmap::~HLFSVolumeUnmap() = default;
 
 std::shared_ptr<InputSpec> HLFSVolumeUnmap::GetInputSpecInternal()
 {
-    auto spec = VolumeChoiceInputSpec("The label of the HLFS volume to unmap the free blocks.",
+    auto inputs = VolumeChoiceInputSpec("The label of the HLFS volume to unmap the free blocks.",
                                       "The uuid of the HLFS volume to unmap the free blocks.");
-    AddParameter(spec, {kReclaimUnitParameter, "n", ParameterType::Int,
+    AddParameter(inputs, {kReclaimUnitParameter, "n", ParameterType::Int,
                         "Number of HLFS blocks that should be unmapped per iteration."});
-    return spec;
+    return inputs;
 }
 
 std::shared_ptr<OutputSpec> HLFSVolumeUnmap::GetOutputSpecInternal() { return BooleanOutputSpec(); }

@@ -28,19 +28,19 @@ std::shared_ptr<ParameterSpec> IgnoreErrorInputParameter()
 
 std::shared_ptr<InputSpec> GetSingleHLFSVolumeInputSpec()
 {
-    auto spec = InputSpec::New();
-    AddParameter(spec, {kVolumeLabel, "l", ParameterType::String, kLabelDescription});
-    AddParameter(spec, {kVolumeUuid, "u", ParameterType::String, kUuidDescription});
-    return spec;
+    auto inputs = InputSpec::New();
+    AddParameter(inputs, {kVolumeLabel, "l", ParameterType::String, kLabelDescription});
+    AddParameter(inputs, {kVolumeUuid, "u", ParameterType::String, kUuidDescription});
+    return inputs;
 }
 
 std::shared_ptr<InputSpec> GetMultipleHLFSVolumesInputSpec()
 {
-    auto spec = InputSpec::New();
-    AddParameter(spec, {kVolumeLabel, "l", ParameterType::StringList, kLabelDescription});
-    AddParameter(spec, {kVolumeUuid, "u", ParameterType::StringList, kUuidDescription});
-    spec->AddParameter(IgnoreErrorInputParameter());
-    return spec;
+    auto inputs = InputSpec::New();
+    AddParameter(inputs, {kVolumeLabel, "l", ParameterType::StringList, kLabelDescription});
+    AddParameter(inputs, {kVolumeUuid, "u", ParameterType::StringList, kUuidDescription});
+    inputs->AddParameter(IgnoreErrorInputParameter());
+    return inputs;
 }
 
 std::unique_ptr<HlFileSystem> GetSingleHLFSVolume(const InputPtr& in, const OutputPtr& out)

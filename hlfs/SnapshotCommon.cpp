@@ -19,11 +19,11 @@ const char* TranslateSnapshotReason(unsigned code)
     return code < reasons.size() ? reasons[code] : "unknown error";
 }
 
-void AddSnapshotSelectionParameters(const std::shared_ptr<InputSpec>& spec, const char* labelDescription,
+void AddSnapshotSelectionParameters(const std::shared_ptr<InputSpec>& inputs, const char* labelDescription,
                                     const char* uuidDescription)
 {
-    AddParameter(spec, {"volume-label", "l", ParameterType::String, labelDescription});
-    AddParameter(spec, {"volume-uuid", "u", ParameterType::String, uuidDescription});
+    AddParameter(inputs, {"volume-label", "l", ParameterType::String, labelDescription});
+    AddParameter(inputs, {"volume-uuid", "u", ParameterType::String, uuidDescription});
 }
 
 SnapshotSelection SnapshotSelection::FromInput(const InputPtr& in)

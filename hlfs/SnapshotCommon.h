@@ -20,7 +20,7 @@ using KnxCtl::Storage::UnresolvedHlfsVolumeImpl;
 const char* TranslateSnapshotReason(unsigned code);
 
 // Adds `volume-label` then `volume-uuid`, both optional strings, with the command's own wording.
-void AddSnapshotSelectionParameters(const std::shared_ptr<InputSpec>& spec, const char* labelDescription,
+void AddSnapshotSelectionParameters(const std::shared_ptr<InputSpec>& inputs, const char* labelDescription,
                                     const char* uuidDescription);
 
 // Which unresolved copies a snapshot command acts on. An empty value is no filter.

@@ -52,10 +52,10 @@ ClusteredHdskSet::~ClusteredHdskSet() = default;
 
 std::shared_ptr<InputSpec> ClusteredHdskSet::GetInputSpecInternal()
 {
-    auto spec = GetSingleHLFSVolumeInputSpec();
-    AddParameter(spec, {kEnabledParameter, "e", ParameterType::Bool,
+    auto inputs = GetSingleHLFSVolumeInputSpec();
+    AddParameter(inputs, {kEnabledParameter, "e", ParameterType::Bool,
                         "The new enabled state of the clustered HDSK support.", true});
-    return spec;
+    return inputs;
 }
 
 std::shared_ptr<OutputSpec> ClusteredHdskSet::GetOutputSpecInternal() { return BooleanOutputSpec(); }

@@ -41,29 +41,29 @@ NFS41VolumeAdd::~NFS41VolumeAdd() = default;
 std::shared_ptr<InputSpec> NFS41VolumeAdd::GetInputSpecInternal()
 {
     const bool knxnicBinding = IsFeatureEnabled(Feature::Nfs41KnxnicBinding);
-    auto spec = InputSpec::New();
+    auto inputs = InputSpec::New();
     if (knxnicBinding) {
-        AddParameter(spec, {NfsAddArg::kHostKnxnic, "I", ParameterType::StringList,
+        AddParameter(inputs, {NfsAddArg::kHostKnxnic, "I", ParameterType::StringList,
                             "The hostname or IP address followed by a colon(:) and knxnic name. This parameter can "
                             "be specified more than once. E.g.: --host-knxnic=host1:knxnic1 "
                             "--host-knxnic=ip2:knxnic2"});
     }
-    AddParameter(spec, {kHosts, "H", ParameterType::StringList,
+    AddParameter(inputs, {kHosts, "H", ParameterType::StringList,
                         "The hostname(s) or IP address(es) (comma-separated) of the server for the NFS v4.1 volume "
                         "to add and mount on the system.",
                         !knxnicBinding});
-    AddParameter(spec,
+    AddParameter(inputs,
                  {NfsAddArg::kIsPE, "p", ParameterType::Flag, "If set, this flag will set the mount point to be PE."});
-    AddParameter(spec, {NfsAddArg::kShare, "s", ParameterType::String,
+    AddParameter(inputs, {NfsAddArg::kShare, "s", ParameterType::String,
                         "The share name on the remote system to use for this NFS v4.1 mount point.", true});
-    AddParameter(spec, {NfsAddArg::kVolumeName, "v", ParameterType::String,
+    AddParameter(inputs, {NfsAddArg::kVolumeName, "v", ParameterType::String,
                         "The volume name to use for the NFS v4.1 mount.  This must be a unique volume name and "
                         "cannot conflict with existing NAS, NFS v4.1, HLFS, or other volume names.",
                         true});
-    AddParameter(spec, {NfsAddArg::kReadOnly, "r", ParameterType::Flag,
+    AddParameter(inputs, {NfsAddArg::kReadOnly, "r", ParameterType::Flag,
                         "If set, this flag will make the mount point be read-only."});
     AddParameter(
-        spec,
+        inputs,
         {kSecurity, "a", ParameterType::String, "Security flavors. Acceptable values are: %ENUM%.", false,
          StringEnum({
              {NetworkFileSystem::NFS_AUTH_SYS_STR.c_str(), "Authentication based on traditional UNIX ID"},
@@ -71,7 +71,7 @@ std::shared_ptr<InputSpec> NFS41VolumeAdd::GetInputSpecInternal()
               "Kerberos authentication with RPC header integrity protection"},
              {NetworkFileSystem::NFS_AUTH_KRB5I_STR.c_str(), "Kerberos authentication with data integrity protection"},
          })});
-    return spec;
+    return inputs;
 }
 
 std::shared_ptr<OutputSpec> NFS41VolumeAdd::GetOutputSpecInternal() { return BooleanOutputSpec(); }

@@ -59,35 +59,35 @@ NFSVolumeAdd::~NFSVolumeAdd() = default;
 std::shared_ptr<InputSpec> NFSVolumeAdd::GetInputSpecInternal()
 {
     const bool knxnicBinding = IsFeatureEnabled(Feature::NfsKnxnicBinding);
-    auto spec = InputSpec::New();
-    AddParameter(spec,
+    auto inputs = InputSpec::New();
+    AddParameter(inputs,
                  {kHost, "H", ParameterType::String,
                   "The hostname or IP address of the NAS volume to add and mount on the system.", !knxnicBinding});
     if (knxnicBinding) {
-        AddParameter(spec, {NfsAddArg::kHostKnxnic, "I", ParameterType::String,
+        AddParameter(inputs, {NfsAddArg::kHostKnxnic, "I", ParameterType::String,
                             "The hostname or IP address of the NAS volume to add, followed by a colon(:) and knxnic "
                             "name i.e. <host/IP>:<knxnic> "});
     }
-    AddParameter(spec, {NfsAddArg::kShare, "s", ParameterType::String,
+    AddParameter(inputs, {NfsAddArg::kShare, "s", ParameterType::String,
                         "The share name on the remote system to use for this NAS mount point.", true});
-    AddParameter(spec, {NfsAddArg::kVolumeName, "v", ParameterType::String,
+    AddParameter(inputs, {NfsAddArg::kVolumeName, "v", ParameterType::String,
                         "The volume name to use for the NAS mount.  This must be a unique volume name and cannot "
                         "conflict with existing NAS, HLFS or other volume names.",
                         true});
     if (IsFeatureEnabled(Feature::NfsConnections)) {
-        AddParameter(spec, {kConnections, "c", ParameterType::Int,
+        AddParameter(inputs, {kConnections, "c", ParameterType::Int,
                             "The number of RPC connections to be established for the NFS datastore. Minimum and "
                             "default values are 1 and maximum is 8. A higher number of connections yields better "
                             "performance on datastores with higher IO load.",
                             false, IntRange(1, 8)});
     }
-    AddParameter(spec, {NfsAddArg::kReadOnly, "r", ParameterType::Flag,
+    AddParameter(inputs, {NfsAddArg::kReadOnly, "r", ParameterType::Flag,
                         "If set this flag will set the mount point to be read-only."});
-    AddParameter(spec,
+    AddParameter(inputs,
                  {NfsAddArg::kIsPE, "p", ParameterType::Flag, "If set this flag will set the mount point to be PE."});
-    AddParameter(spec, {kMountRetry, "", ParameterType::Flag, ""});
-    AddParameter(spec, {kQueueDepth, "", ParameterType::Int, "", false, IntRange(1, 4294967295L)});
-    return spec;
+    AddParameter(inputs, {kMountRetry, "", ParameterType::Flag, ""});
+    AddParameter(inputs, {kQueueDepth, "", ParameterType::Int, "", false, IntRange(1, 4294967295L)});
+    return inputs;
 }
 
 std::shared_ptr<OutputSpec> NFSVolumeAdd::GetOutputSpecInternal() { return BooleanOutputSpec(); }

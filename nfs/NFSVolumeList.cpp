@@ -97,9 +97,9 @@ std::shared_ptr<MetaStruct> MakeV41Row(bool knxnics)
 
 std::shared_ptr<InputSpec> PeOnlyInputSpec(const char* description)
 {
-    auto spec = InputSpec::New();
-    AddParameter(spec, {"pe-only", "p", ParameterType::Flag, description});
-    return spec;
+    auto inputs = InputSpec::New();
+    AddParameter(inputs, {"pe-only", "p", ParameterType::Flag, description});
+    return inputs;
 }
 
 } // namespace

@@ -60,14 +60,14 @@ constexpr const char* kBaseParamFields = "Volume Name, MaxQueueDepth, MaxReadTra
 
 std::shared_ptr<InputSpec> VolumeNameInputSpec(const char* description)
 {
-    auto spec = InputSpec::New();
-    AddParameter(spec, {kVolumeName, "v", ParameterType::String, description, true});
-    return spec;
+    auto inputs = InputSpec::New();
+    AddParameter(inputs, {kVolumeName, "v", ParameterType::String, description, true});
+    return inputs;
 }
 
-void AddMaxQueueDepthParameter(const std::shared_ptr<InputSpec>& spec, const char* description)
+void AddMaxQueueDepthParameter(const std::shared_ptr<InputSpec>& inputs, const char* description)
 {
-    AddParameter(spec, {kMaxQueueDepth, "q", ParameterType::Int, description, false, IntRange(1, 4294967295L)});
+    AddParameter(inputs, {kMaxQueueDepth, "q", ParameterType::Int, description, false, IntRange(1, 4294967295L)});
 }
 
 // Rows of the non-PE volumes named `name` (only the first that could be read), or of every
@@ -206,19 +206,19 @@ NFSVolumeParamSet::~NFSVolumeParamSet() = default;
 std::shared_ptr<InputSpec> NFSVolumeParamSet::GetInputSpecInternal()
 {
     const V3ParamFeatures features;
-    auto spec = VolumeNameInputSpec("The NAS volume name.");
-    AddMaxQueueDepthParameter(spec, "The maximum queue depth for the NAS volume.");
+    auto inputs = VolumeNameInputSpec("The NAS volume name.");
+    AddMaxQueueDepthParameter(inputs, "The maximum queue depth for the NAS volume.");
     if (features.knxnic) {
-        AddParameter(spec,
+        AddParameter(inputs,
                      {kKnxnic, "I", ParameterType::String, "The new knxnic to be configured for the NAS volume."});
     }
     if (features.connections) {
-        AddParameter(spec, {kConnections, "c", ParameterType::Int,
+        AddParameter(inputs, {kConnections, "c", ParameterType::Int,
                             "The number of RPC connections to be established for the NFS datastore. A higher number "
                             "of connections yields better performance on datastores with higher IO load.",
                             false, IntRange(1, 8)});
     }
-    return spec;
+    return inputs;
 }
 
 std::shared_ptr<OutputSpec> NFSVolumeParamSet::GetOutputSpecInternal() { return BooleanOutputSpec(); }
@@ -302,14 +302,14 @@ NFS41VolumeParamSet::~NFS41VolumeParamSet() = default;
 
 std::shared_ptr<InputSpec> NFS41VolumeParamSet::GetInputSpecInternal()
 {
-    auto spec = VolumeNameInputSpec("The NFS v4.1 volume name.");
-    AddMaxQueueDepthParameter(spec, "The maximum queue depth for the NFS v4.1 volume.");
+    auto inputs = VolumeNameInputSpec("The NFS v4.1 volume name.");
+    AddMaxQueueDepthParameter(inputs, "The maximum queue depth for the NFS v4.1 volume.");
     if (IsFeatureEnabled(Feature::Nfs41KnxnicBinding)) {
-        AddParameter(spec, {kHostKnxnic, "I", ParameterType::StringList,
+        AddParameter(inputs, {kHostKnxnic, "I", ParameterType::StringList,
                             "The hostname or IP address followed by a colon(:) and knxnic name. This parameter can be "
                             "specified more than once. E.g.: --host-knxnic=host1:knxnic1 --host-knxnic=ip2:knxnic2"});
     }
-    return spec;
+    return inputs;
 }
 
 std::shared_ptr<OutputSpec> NFS41VolumeParamSet::GetOutputSpecInternal() { return BooleanOutputSpec(); }

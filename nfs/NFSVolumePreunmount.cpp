@@ -12,9 +12,9 @@ using PreunmountOperation = void (StorageInfoImpl::*)(const std::string&);
 
 std::shared_ptr<InputSpec> PreunmountInputSpec(const char* volumeNameDescription)
 {
-    auto spec = InputSpec::New();
-    AddParameter(spec, {kVolumeName, "v", ParameterType::String, volumeNameDescription, true});
-    return spec;
+    auto inputs = InputSpec::New();
+    AddParameter(inputs, {kVolumeName, "v", ParameterType::String, volumeNameDescription, true});
+    return inputs;
 }
 
 // Runs `operation` on the named volume. Unlike other commands, the host's message never

@@ -12,9 +12,9 @@ constexpr const char* kVolumeName = "volume-name";
 
 std::shared_ptr<InputSpec> RemoveInputSpec(const char* volumeNameDescription)
 {
-    auto spec = InputSpec::New();
-    AddParameter(spec, {kVolumeName, "v", ParameterType::String, volumeNameDescription, true});
-    return spec;
+    auto inputs = InputSpec::New();
+    AddParameter(inputs, {kVolumeName, "v", ParameterType::String, volumeNameDescription, true});
+    return inputs;
 }
 
 // Removes the volume of that name and version, telling the datastore notification script

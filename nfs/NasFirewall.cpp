@@ -39,9 +39,9 @@ constexpr const char* kIpMask = "ip-mask";
 
 std::shared_ptr<InputSpec> IpMaskInputSpec(const char* description)
 {
-    auto spec = InputSpec::New();
-    AddParameter(spec, {kIpMask, "F", ParameterType::String, description, true});
-    return spec;
+    auto inputs = InputSpec::New();
+    AddParameter(inputs, {kIpMask, "F", ParameterType::String, description, true});
+    return inputs;
 }
 
 // Only entries with a mask may be added: IPv4 with /0-32 (1) or IPv6 with /0-128 (3).

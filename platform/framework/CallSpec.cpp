@@ -26,10 +26,10 @@ void ParameterConstraint::SetIntRange(long min, long max)
 
 std::shared_ptr<ParameterSpec> ParameterSpec::New(const std::string& name, ParameterType type)
 {
-    auto spec = std::make_shared<ParameterSpec>();
-    spec->name_ = name;
-    spec->type_ = type;
-    return spec;
+    auto inputs = std::make_shared<ParameterSpec>();
+    inputs->name_ = name;
+    inputs->type_ = type;
+    return inputs;
 }
 
 void ParameterSpec::SetShortName(const std::string& shortName) { shortName_ = shortName; }
@@ -42,7 +42,7 @@ std::shared_ptr<InputSpec> InputSpec::New() { return std::make_shared<InputSpec>
 void InputSpec::AddParameter(std::shared_ptr<ParameterSpec> parameter)
 {
     if (!parameter) {
-        throw QuilletException("A parameter specification must not be empty");
+        throw QuilletException("A parameter description must not be empty");
     }
     parameters_.push_back(std::move(parameter));
 }

@@ -76,8 +76,8 @@ std::string GlobalOptionsHelp()
 
 std::string ResultHelp(Command& command)
 {
-    const auto spec = command.GetOutputSpec();
-    const auto& root = spec->GetRootObject();
+    const auto outputs = command.GetOutputSpec();
+    const auto& root = outputs->GetRootObject();
     if (!root) {
         return {};
     }

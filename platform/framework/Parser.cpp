@@ -197,8 +197,8 @@ private:
 // Reads the command's own parameters into an Input, checking each value as it comes.
 class ParameterReader {
 public:
-    ParameterReader(std::shared_ptr<CallSpec::InputSpec> spec, std::shared_ptr<Input> input)
-        : spec_(std::move(spec)), input_(std::move(input))
+    ParameterReader(std::shared_ptr<CallSpec::InputSpec> inputs, std::shared_ptr<Input> input)
+        : spec_(std::move(inputs)), input_(std::move(input))
     {
     }
 

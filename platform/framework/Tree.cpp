@@ -72,14 +72,14 @@ std::shared_ptr<CallSpec::InputSpec> Command::GetInputSpec()
     // Commands add their examples while describing their input; start afresh so
     // that repeated calls do not pile them up.
     ClearExamples();
-    auto spec = GetInputSpecInternal();
-    return spec ? spec : CallSpec::InputSpec::New();
+    auto inputs = GetInputSpecInternal();
+    return inputs ? inputs : CallSpec::InputSpec::New();
 }
 
 std::shared_ptr<CallSpec::OutputSpec> Command::GetOutputSpec()
 {
-    auto spec = GetOutputSpecInternal();
-    return spec ? spec : CallSpec::OutputSpec::New();
+    auto outputs = GetOutputSpecInternal();
+    return outputs ? outputs : CallSpec::OutputSpec::New();
 }
 
 void Command::Execute(const std::shared_ptr<CallSpec::Input>& in, const std::shared_ptr<CallSpec::Output>& out)

@@ -103,12 +103,12 @@ std::vector<std::string> Problems(Command& command)
         }
     }
 
-    const auto spec = command.GetOutputSpec();
-    if (!spec || !spec->GetRootObject()) {
+    const auto outputs = command.GetOutputSpec();
+    if (!outputs || !outputs->GetRootObject()) {
         problems.push_back("no result declared");
         return problems;
     }
-    const auto structure = ResultStructure(spec->GetRootObject());
+    const auto structure = ResultStructure(outputs->GetRootObject());
     std::set<std::string> fields;
     if (structure) {
         for (const auto& [field, value] : structure->GetFields()) {

@@ -36,17 +36,17 @@ public:
 protected:
     std::shared_ptr<InputSpec> GetInputSpecInternal() override
     {
-        auto spec = InputSpec::New();
+        auto inputs = InputSpec::New();
         if (describe) {
-            describe(*spec, *this);
+            describe(*inputs, *this);
         }
-        return spec;
+        return inputs;
     }
     std::shared_ptr<OutputSpec> GetOutputSpecInternal() override
     {
-        auto spec = OutputSpec::New();
-        spec->SetRootObject(shape());
-        return spec;
+        auto outputs = OutputSpec::New();
+        outputs->SetRootObject(shape());
+        return outputs;
     }
     void ExecuteInternal(const std::shared_ptr<Input>& in, const std::shared_ptr<Output>& out) override
     {

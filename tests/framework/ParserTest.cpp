@@ -36,16 +36,16 @@ struct Tree {
         auto storage = Namespace::New();
         auto volume = Namespace::New();
         volume->SetDescription("Volume operations.");
-        set->describe = [](InputSpec& spec, FakeCommand& self) {
-            spec.AddParameter(Param("name", "n", ParameterType::String, true));
-            spec.AddParameter(Param("depth", "q", ParameterType::Int, false, Range(1, 4294967295L)));
-            spec.AddParameter(Param("big", "", ParameterType::Int));
-            spec.AddParameter(Param("enabled", "e", ParameterType::Bool));
-            spec.AddParameter(Param("force", "f", ParameterType::Flag));
-            spec.AddParameter(Param("hosts", "H", ParameterType::StringList));
-            spec.AddParameter(Param("level", "l", ParameterType::String, false, Levels()));
-            spec.AddParameter(Param("Index", "I", ParameterType::String));
-            spec.AddParameter(Param("index", "i", ParameterType::String));
+        set->describe = [](InputSpec& inputs, FakeCommand& self) {
+            inputs.AddParameter(Param("name", "n", ParameterType::String, true));
+            inputs.AddParameter(Param("depth", "q", ParameterType::Int, false, Range(1, 4294967295L)));
+            inputs.AddParameter(Param("big", "", ParameterType::Int));
+            inputs.AddParameter(Param("enabled", "e", ParameterType::Bool));
+            inputs.AddParameter(Param("force", "f", ParameterType::Flag));
+            inputs.AddParameter(Param("hosts", "H", ParameterType::StringList));
+            inputs.AddParameter(Param("level", "l", ParameterType::String, false, Levels()));
+            inputs.AddParameter(Param("Index", "I", ParameterType::String));
+            inputs.AddParameter(Param("index", "i", ParameterType::String));
             self.AddExample("-n vol1", "Change vol1.");
         };
         set->shape = [] { return MetaList::New(MetaType::Struct, VolumeShape()); };
@@ -186,10 +186,10 @@ TEST(Parser, Int64Boundaries)
 TEST(Help, CommandHelpShowsParametersExamplesAndFieldsOnce)
 {
     Tree tree;
-    tree.set->describe = [old = tree.set->describe](InputSpec& spec, FakeCommand& self) {
-        old(spec, self);
-        spec.AddParameter(Param("mode", "m", ParameterType::String, false, Levels()));
-        spec.GetParameters().back()->SetDescription("Mode, one of %ENUM%.");
+    tree.set->describe = [old = tree.set->describe](InputSpec& inputs, FakeCommand& self) {
+        old(inputs, self);
+        inputs.AddParameter(Param("mode", "m", ParameterType::String, false, Levels()));
+        inputs.GetParameters().back()->SetDescription("Mode, one of %ENUM%.");
     };
     const auto help = CommandHelp({"storage", "volume", "set"}, *tree.set);
     const auto again = CommandHelp({"storage", "volume", "set"}, *tree.set);

@@ -35,7 +35,7 @@ class EchoCommand : public virtual Quillets::AutoCli::Command {
 protected:
     std::shared_ptr<InputSpec> GetInputSpecInternal() override
     {
-        auto spec = InputSpec::New();
+        auto inputs = InputSpec::New();
         auto add = [&](const char* name, const char* shortName, ParameterType type, bool required,
                        std::shared_ptr<ParameterConstraint> constraint) {
             auto parameter = ParameterSpec::New(name, type);
@@ -43,7 +43,7 @@ protected:
             parameter->SetDescription("Values: %ENUM%.");
             parameter->SetRequired(required);
             parameter->SetConstraint(std::move(constraint));
-            spec->AddParameter(parameter);
+            inputs->AddParameter(parameter);
         };
         auto range = ParameterConstraint::New(ParameterConstraintType::IntRange);
         range->SetIntRange(1, 4294967295L);
@@ -60,13 +60,13 @@ protected:
         add("levels", "L", ParameterType::StringList, false, levels);
         add("help-me", "h", ParameterType::String, false, nullptr);
         AddExample("-n x", "Example.");
-        return spec;
+        return inputs;
     }
     std::shared_ptr<OutputSpec> GetOutputSpecInternal() override
     {
-        auto spec = OutputSpec::New();
-        spec->SetRootObject(MetaList::New(MetaType::Struct, Row()));
-        return spec;
+        auto outputs = OutputSpec::New();
+        outputs->SetRootObject(MetaList::New(MetaType::Struct, Row()));
+        return outputs;
     }
     void ExecuteInternal(const std::shared_ptr<Input>& in, const std::shared_ptr<Output>& out) override
     {
@@ -93,9 +93,9 @@ protected:
     std::shared_ptr<InputSpec> GetInputSpecInternal() override { return InputSpec::New(); }
     std::shared_ptr<OutputSpec> GetOutputSpecInternal() override
     {
-        auto spec = OutputSpec::New();
-        spec->SetRootObject(Row());
-        return spec;
+        auto outputs = OutputSpec::New();
+        outputs->SetRootObject(Row());
+        return outputs;
     }
     void ExecuteInternal(const std::shared_ptr<Input>&, const std::shared_ptr<Output>& out) override
     {
