@@ -361,7 +361,7 @@ TEST(HostOperations, HlfsOpenConvertAndSettings)
         {"/hlfs/volumes/v5", ""},
         {"/hlfs/volumes/boot", "Cannot open HLFS volume at '/hlfs/volumes/boot'"},
         {"/hlfs/volumes/ub", "Cannot open HLFS volume at '/hlfs/volumes/ub'"},
-        {"/vmfs/u3", "Cannot open HLFS volume at '/vmfs/u3'"},
+        {"/volumes/u3", "Cannot open HLFS volume at '/volumes/u3'"},
     };
     for (const auto& [path, message] : opens)
         EXPECT_EQ(MessageOf([p = path] { HlFileSystemImpl fs(p); }), message) << path;
