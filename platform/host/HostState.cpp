@@ -991,12 +991,17 @@ std::string UuidFromText(std::string_view text)
     return out;
 }
 
-State Parse(std::istream& in, const std::string& source)
+namespace {
+
+// Reads a state from any input the JSON reader takes: a stream for files, which never
+// holds a whole large file in memory, or the built-in text, read in place.
+template <typename Input>
+State ParseInput(Input&& input, const std::string& source)
 {
     State st;
     try {
         StreamingReader reader(st);
-        json::sax_parse(in, &reader, json::input_format_t::json, true, false);
+        json::sax_parse(std::forward<Input>(input), &reader, json::input_format_t::json, true, false);
         if (!reader.root.is_object())
             throw PlaceError{"", std::string("expected a JSON object at the top level, found ") +
                                      reader.root.type_name()};
@@ -1014,10 +1019,16 @@ State Parse(std::istream& in, const std::string& source)
     return st;
 }
 
+} // namespace
+
+State Parse(std::istream& in, const std::string& source)
+{
+    return ParseInput(in, source);
+}
+
 State Demo()
 {
-    std::istringstream in(kDemoHost);
-    return Parse(in, "built-in demo host");
+    return ParseInput(std::string_view(kDemoHost), "built-in demo host");
 }
 
 void Write(const State& st, std::ostream& out)
