@@ -1,19 +1,14 @@
 // storage hlfs host list in process: the status of each host against the volume's locking
-// mode, and no partial list after a host failure. Rows, the liveness check and the table
-// are covered by the hlfs-host fixture cases.
+// mode. Rows, failures, the liveness check and the table are in the hlfs-host fixture cases.
 
 #include <string>
 #include <vector>
 
 #include <gtest/gtest.h>
-#include <nlohmann/json.hpp>
 
 #include "hlfs/HLFSVolumeHostList.h"
-#include "support/Cli.h"
-#include "support/HostFixture.h"
 
 using namespace OrvaneCli::FileSystem;
-using nlohmann::json;
 
 namespace {
 
@@ -41,30 +36,6 @@ TEST(HlfsHostListTest, StatusByVolumeModeAndHostMode)
         // The status tests the bit of value 4, not equality.
         EXPECT_STREQ(HLFSVolumeHostList::TranslateStatus(c.volumeMode, 6), c.atsHost);
         EXPECT_STREQ(HLFSVolumeHostList::TranslateStatus(c.volumeMode, 0xFB), c.otherHost);
-    }
-}
-
-std::string State(const json& faults)
-{
-    const json user = {{"heartbeatUuid", "hb-a"}, {"lockModeInUse", 4}};
-    const json volume = {{"type", "HLFS"}, {"volumeName", "ds1"}, {"lockMode", 0x10}, {"users", json::array({user, user})}};
-    return json{{"fileSystems", json::array({volume})}, {"faults", faults}}.dump();
-}
-
-TEST(HlfsHostListTest, HostFailureShowsNoPartialList)
-{
-    for (const std::string call : {"HlFileSystem.GetUsers", "HlFileSystem.GetLockMode"}) {
-        SCOPED_TRACE(call);
-        // Let the first lock mode read through, so a partial list would be visible.
-        const int skip = call == "HlFileSystem.GetLockMode" ? 1 : 0;
-        TestSupport::ScopedHost host(
-            State(json::array({{{"call", call}, {"message", "Heartbeat region unreadable"}, {"skip", skip}}})));
-        auto in = Input::New();
-        in->SetParameter("volume-label", "ds1");
-        HLFSVolumeHostList command;
-        const auto result = TestSupport::Execute(command, in);
-        EXPECT_EQ(result.errors, std::vector<std::string>{"Heartbeat region unreadable"});
-        EXPECT_EQ(result.root, nullptr);
     }
 }
 
