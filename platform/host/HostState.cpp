@@ -794,92 +794,154 @@ ojson ListOf(const std::vector<T>& items, F&& convert)
     return list;
 }
 
-const char* const kDemoHost = R"({
-  "features": {"102": true, "103": true, "104": true, "270": true},
-  "advancedOptions": {
-    "HLFS3": {"EnableOnlineATSUpgrade": 1, "MaxHeapSizeMB": 256},
-    "NFS": {"MaxVolumes": 8, "HeartbeatFrequency": 12},
-    "Misc": {"HostName": "host01.lab.example"}
-  },
-  "fileSystems": [
+// The demo host is built in place rather than parsed from text: it is what every run
+// without a state file starts from, so it must cost next to nothing.
+Record DemoFileSystem(State& st, const char* type, const char* volumeName, const char* uuid, std::uint64_t capacity,
+                      std::uint64_t used)
+{
+    Record r;
+    r.type = type;
+    r.volumeName = volumeName;
+    r.uuid = uuid;
+    r.capacity = capacity;
+    r.used = used;
+    for (FsKey key : {FsKey::type, FsKey::volumeName, FsKey::uuid, FsKey::capacity, FsKey::used})
+        r.Mark(key);
+    r.kind = KindOfType(r.type);
+    r.id = st.nextFileSystemId++;
+    return r;
+}
+
+HlfsFields& DemoHlfs(Record& r, const char* lvmUuid, std::int32_t qaxiState, std::int32_t majorVersion,
+                     std::uint32_t lockMode)
+{
+    r.qaxiState = qaxiState;
+    auto& h = r.MutableHlfs();
+    h.lvmUuid = lvmUuid;
+    h.majorVersion = majorVersion;
+    h.lockMode = lockMode;
+    h.atsSupport = 1;
+    for (FsKey key : {FsKey::lvmUuid, FsKey::qaxiState, FsKey::majorVersion, FsKey::lockMode, FsKey::atsSupport,
+                      FsKey::extents})
+        r.Mark(key);
+    return h;
+}
+
+User DemoUser(const char* heartbeatUuid, const char* mac, std::uint32_t major, std::uint32_t minor,
+              std::int64_t offset, std::uint8_t lockModeInUse)
+{
+    User u;
+    u.heartbeatUuid = heartbeatUuid;
+    u.macAddress = mac;
+    u.driverVersionMajor = major;
+    u.driverVersionMinor = minor;
+    u.heartbeatOffset = offset;
+    u.lockModeInUse = lockModeInUse;
+    return u;
+}
+
+State BuildDemo()
+{
+    State st;
+    for (auto& feature : st.features)
+        feature = true;
+    // Groups and options in name order, as a state file's objects are read.
+    st.advancedOptions = {
+        {"HLFS3", {{"EnableOnlineATSUpgrade", std::int64_t{1}}, {"MaxHeapSizeMB", std::int64_t{256}}}},
+        {"Misc", {{"HostName", std::string("host01.lab.example")}}},
+        {"NFS", {{"HeartbeatFrequency", std::int64_t{12}}, {"MaxVolumes", std::int64_t{8}}}},
+    };
+
+    auto& fileSystems = st.fileSystems;
+    fileSystems.reserve(6);
     {
-      "type": "HLFS", "volumeName": "datastore1",
-      "uuid": "5f8d2a31-6c1e47b2-9a0f-001e67c4d2a8", "lvmUuid": "5f8d2a30-1b7c3d44-e2c1-001e67c4d2a8",
-      "capacity": 536602476544, "used": 193273528320, "qaxiState": 1,
-      "majorVersion": 6, "lockMode": 16, "atsSupport": 1,
-      "extents": [{"deviceName": "naa.600508b1001c7e4d2f9a8b3c6d5e4f10", "partition": 3}],
-      "users": [
-        {"heartbeatUuid": "5f8d2a35-0a4c8e21-77d3-001e67c4d2a8", "macAddress": "00:1e:67:c4:d2:a8",
-         "driverVersionMajor": 6, "driverVersionMinor": 82, "heartbeatOffset": 3145728, "lockModeInUse": 1},
-        {"heartbeatUuid": "5f8d2b11-4e9a0c37-1b62-001e67c4d310", "macAddress": "00:1e:67:c4:d3:10",
-         "driverVersionMajor": 6, "driverVersionMinor": 82, "heartbeatOffset": 3149824, "lockModeInUse": 1}
-      ]
-    },
-    {
-      "type": "HLFS", "volumeName": "shared-ds01",
-      "uuid": "5f8d2b02-91a0c3e5-4d21-001e67c4d2a8", "lvmUuid": "5f8d2b01-7ac4e0d9-3f18-001e67c4d2a8",
-      "capacity": 2198754820096, "used": 1319413953331, "qaxiState": 1,
-      "majorVersion": 5, "lockMode": 0, "atsSupport": 1,
-      "extents": [
-        {"deviceName": "naa.60060160a62031002f7c8e4b9d1a5e21", "partition": 1},
-        {"deviceName": "naa.60060160a62031003a8d9f5c0e2b6f32", "partition": 1}
-      ],
-      "users": [
-        {"heartbeatUuid": "5f8d2b05-2c7e9a14-58b0-001e67c4d2a8", "macAddress": "00:1e:67:c4:d2:a8",
-         "driverVersionMajor": 5, "driverVersionMinor": 61, "heartbeatOffset": 3407872, "lockModeInUse": 0}
-      ],
-      "unmapProperty": {"granularity": 1048576, "priority": "none", "bandwidth": 0, "reserved": 0, "method": "priority"}
-    },
-    {
-      "type": "HLFS", "volumeName": "legacy-ds03",
-      "uuid": "4e1c7a90-2d3b5f68-8c17-001e67c4d2a8", "lvmUuid": "4e1c7a8f-93e0b2d6-0a45-001e67c4d2a8",
-      "capacity": 268435456000, "used": 107374182400, "qaxiState": 2,
-      "majorVersion": 3, "lockMode": 0, "atsSupport": 1,
-      "extents": [{"deviceName": "naa.600508b1001c5a3b4c2d1e0f9a8b7c61", "partition": 1}]
-    },
-    {
-      "type": "NFS", "volumeName": "nfs-iso", "uuid": "b7e21c4f-09d3a6e8",
-      "remoteHost": "10.20.30.40", "remoteShare": "/exports/iso",
-      "capacity": 1099511627776, "used": 412316860416, "readOnly": true,
-      "knxnic": "", "knxnics": "", "connections": 1, "maxQueueDepth": 64
-    },
-    {
-      "type": "NFS41", "volumeName": "nfs41-vms", "uuid": "c4a9d0e2-5b8f1736",
-      "remoteHosts": ["10.20.30.41", "10.20.30.42"], "remoteShare": "/exports/vms",
-      "capacity": 4398046511104, "used": 1649267441664, "securityType": 1
-    },
-    {
-      "type": "vfat", "volumeName": "BOOTBANK1", "uuid": "6a3f1e2d-8b4c5a69-0d7e-001e67c4d2a8",
-      "capacity": 4293591040, "used": 1438646272
+        auto r = DemoFileSystem(st, "HLFS", "datastore1", "5f8d2a31-6c1e47b2-9a0f-001e67c4d2a8", 536602476544,
+                                193273528320);
+        auto& h = DemoHlfs(r, "5f8d2a30-1b7c3d44-e2c1-001e67c4d2a8", 1, 6, 16);
+        h.extents.push_back({"naa.600508b1001c7e4d2f9a8b3c6d5e4f10", 3});
+        h.users.push_back(DemoUser("5f8d2a35-0a4c8e21-77d3-001e67c4d2a8", "00:1e:67:c4:d2:a8", 6, 82, 3145728, 1));
+        h.users.push_back(DemoUser("5f8d2b11-4e9a0c37-1b62-001e67c4d310", "00:1e:67:c4:d3:10", 6, 82, 3149824, 1));
+        r.Mark(FsKey::users);
+        fileSystems.push_back(std::move(r));
     }
-  ],
-  "unresolvedVolumes": [
     {
-      "volumeName": "datastore1", "uuid": "5f8d2a31-6c1e47b2-9a0f-001e67c4d2a8",
-      "lvmUuid": "5f8d2a30-1b7c3d44-e2c1-001e67c4d2a8", "majorVersion": 6, "capacity": 536602476544,
-      "mountReason": 6, "resignatureReason": 0,
-      "extents": [{"deviceName": "naa.60060160a620310045b9e1d7f3c8a054", "partition": 3, "start": 0, "end": 511743}]
+        auto r = DemoFileSystem(st, "HLFS", "shared-ds01", "5f8d2b02-91a0c3e5-4d21-001e67c4d2a8", 2198754820096,
+                                1319413953331);
+        auto& h = DemoHlfs(r, "5f8d2b01-7ac4e0d9-3f18-001e67c4d2a8", 1, 5, 0);
+        h.extents.push_back({"naa.60060160a62031002f7c8e4b9d1a5e21", 1});
+        h.extents.push_back({"naa.60060160a62031003a8d9f5c0e2b6f32", 1});
+        h.users.push_back(DemoUser("5f8d2b05-2c7e9a14-58b0-001e67c4d2a8", "00:1e:67:c4:d2:a8", 5, 61, 3407872, 0));
+        h.unmapProperty.priority = "none";
+        r.Mark(FsKey::users);
+        r.Mark(FsKey::unmapProperty);
+        fileSystems.push_back(std::move(r));
     }
-  ],
-  "nfsExports": [
-    {"host": "10.20.30.40", "share": "/exports/iso", "capacity": 1099511627776, "used": 412316860416},
-    {"host": "10.20.30.41", "share": "/exports/vms", "capacity": 4398046511104, "used": 1649267441664},
-    {"host": "10.20.30.42", "share": "/exports/vms", "capacity": 4398046511104, "used": 1649267441664},
-    {"host": "10.20.30.40", "share": "/exports/backup", "capacity": 2199023255552, "used": 329853488332}
-  ],
-  "firewall": {
-    "nfsClient": ["10.20.30.0/24", "fd00:20:30::/64"],
-    "nfs41Client": ["10.20.30.41", "10.20.30.42"]
-  },
-  "heaps": [
-    {"name": "hlfs3", "size": 22020096, "maxSize": 268435456},
-    {"name": "nfsclient", "size": 4194304, "maxSize": 33554432}
-  ],
-  "pointerBlockCache": {
-    "cacheSize": 134217728, "cacheSizeMax": 268435456, "workingSet": 35184372088832,
-    "workingSetMax": 43980465111040, "heapOverhead": 4194304, "capacityMissRatio": 3
-  }
-})";
+    {
+        auto r = DemoFileSystem(st, "HLFS", "legacy-ds03", "4e1c7a90-2d3b5f68-8c17-001e67c4d2a8", 268435456000,
+                                107374182400);
+        auto& h = DemoHlfs(r, "4e1c7a8f-93e0b2d6-0a45-001e67c4d2a8", 2, 3, 0);
+        h.extents.push_back({"naa.600508b1001c5a3b4c2d1e0f9a8b7c61", 1});
+        fileSystems.push_back(std::move(r));
+    }
+    {
+        auto r = DemoFileSystem(st, "NFS", "nfs-iso", "b7e21c4f-09d3a6e8", 1099511627776, 412316860416);
+        auto& n = r.MutableNfs();
+        n.remoteHost = "10.20.30.40";
+        n.remoteShare = "/exports/iso";
+        n.readOnly = true;
+        n.connections = 1;
+        n.maxQueueDepth = 64;
+        for (FsKey key : {FsKey::remoteHost, FsKey::remoteShare, FsKey::readOnly, FsKey::knxnic, FsKey::knxnics,
+                          FsKey::connections, FsKey::maxQueueDepth})
+            r.Mark(key);
+        fileSystems.push_back(std::move(r));
+    }
+    {
+        auto r = DemoFileSystem(st, "NFS41", "nfs41-vms", "c4a9d0e2-5b8f1736", 4398046511104, 1649267441664);
+        auto& n = r.MutableNfs();
+        n.remoteHosts = {"10.20.30.41", "10.20.30.42"};
+        n.remoteShare = "/exports/vms";
+        n.securityType = 1;
+        for (FsKey key : {FsKey::remoteHosts, FsKey::remoteShare, FsKey::securityType})
+            r.Mark(key);
+        fileSystems.push_back(std::move(r));
+    }
+    fileSystems.push_back(
+        DemoFileSystem(st, "vfat", "BOOTBANK1", "6a3f1e2d-8b4c5a69-0d7e-001e67c4d2a8", 4293591040, 1438646272));
+    for (auto& fs : fileSystems)
+        ResolveDefaults(fs);
+
+    UnresolvedVolume u;
+    u.volumeName = "datastore1";
+    u.uuid = "5f8d2a31-6c1e47b2-9a0f-001e67c4d2a8";
+    u.uuidGiven = true;
+    u.lvmUuid = "5f8d2a30-1b7c3d44-e2c1-001e67c4d2a8";
+    u.majorVersion = 6;
+    u.capacity = 536602476544;
+    u.mountReason = 6;
+    u.resignatureReason = 0;
+    u.extents.push_back({false, "naa.60060160a620310045b9e1d7f3c8a054", 3, 0, 511743, true});
+    for (std::string_view key : {"volumeName", "uuid", "lvmUuid", "majorVersion", "capacity", "mountReason",
+                                 "resignatureReason", "extents"})
+        u.Mark(key);
+    u.id = st.nextUnresolvedId++;
+    st.unresolvedVolumes.push_back(std::move(u));
+
+    st.nfsExports = {
+        {"10.20.30.40", "/exports/iso", 1099511627776, 412316860416},
+        {"10.20.30.41", "/exports/vms", 4398046511104, 1649267441664},
+        {"10.20.30.42", "/exports/vms", 4398046511104, 1649267441664},
+        {"10.20.30.40", "/exports/backup", 2199023255552, 329853488332},
+    };
+    st.nfsClient = std::vector<std::string>{"10.20.30.0/24", "fd00:20:30::/64"};
+    st.nfs41Client = std::vector<std::string>{"10.20.30.41", "10.20.30.42"};
+    st.heaps = {{"hlfs3", 22020096, 268435456}, {"nfsclient", 4194304, 33554432}};
+    st.pointerBlockCache = {134217728, 268435456, 35184372088832, 43980465111040, 4194304, 3};
+    for (TopKey key : {TopKey::features, TopKey::advancedOptions, TopKey::fileSystems, TopKey::unresolvedVolumes,
+                       TopKey::nfsExports, TopKey::firewall, TopKey::heaps, TopKey::pointerBlockCache})
+        st.Mark(key);
+    return st;
+}
 
 } // namespace
 
@@ -1028,7 +1090,7 @@ State Parse(std::istream& in, const std::string& source)
 
 State Demo()
 {
-    return ParseInput(std::string_view(kDemoHost), "built-in demo host");
+    return BuildDemo();
 }
 
 void Write(const State& st, std::ostream& out)
