@@ -4,6 +4,7 @@
 #include <memory>
 #include <string>
 #include <utility>
+#include <variant>
 #include <vector>
 
 namespace Quillets::MetaObj {
@@ -67,17 +68,47 @@ public:
     void SetField(const std::string& field, std::shared_ptr<MetaInt> value);
     void SetField(const std::string& field, std::shared_ptr<MetaString> value);
 
-    const std::string& GetName() const { return name_; }
+    const std::string& GetName() const { return *name_; }
     bool HasField(const std::string& field) const;
     // The field's value, or an empty pointer when the structure has no such field.
     std::shared_ptr<MetaObject> GetField(const std::string& field) const;
-    const std::vector<std::pair<std::string, std::shared_ptr<MetaObject>>>& GetFields() const { return fields_; }
+    // Every field as a title and a value object. Made when first asked for after a change;
+    // prefer the look-ups below where many structures are read.
+    const std::vector<std::pair<std::string, std::shared_ptr<MetaObject>>>& GetFields() const;
+
+    // A field's value seen in place, without an object being made for it.
+    struct FieldRef {
+        MetaType type = MetaType::String;   // String also for a field that is not there
+        bool boolean = false;               // Bool
+        std::int64_t number = 0;            // Int
+        const std::string* text = nullptr;  // String; null when the field is not there
+        const MetaObject* object = nullptr; // any other kind of value
+    };
+    static constexpr std::size_t npos = static_cast<std::size_t>(-1);
+    std::size_t GetFieldCount() const { return fields_.size(); }
+    const std::string& GetFieldTitle(std::size_t index) const { return *fields_[index].title; }
+    FieldRef GetFieldRef(std::size_t index) const;
+    // The position of a field, or npos; `hint` is looked at first (rows of one shape share positions).
+    std::size_t FindField(const std::string& field, std::size_t hint = 0) const;
 
 private:
-    void Put(const std::string& field, std::shared_ptr<MetaObject> value);
+    // Rows of a large result hold their plain values in place, and every title and structure
+    // name is kept once per process: a result of many rows stays small.
+    // Values given as objects keep their identity.
+    using Value = std::variant<bool, std::int64_t, std::string, std::shared_ptr<MetaObject>>;
+    struct Field {
+        const std::string* title;
+        Value value;
+    };
+    struct NameEntry;
 
-    std::string name_;
-    std::vector<std::pair<std::string, std::shared_ptr<MetaObject>>> fields_;
+    void Put(const std::string& field, Value value);
+
+    const std::string* name_ = nullptr;
+    NameEntry* entry_ = nullptr;
+    std::vector<Field> fields_;
+    mutable std::vector<std::pair<std::string, std::shared_ptr<MetaObject>>> objects_;
+    mutable bool objectsCurrent_ = false;
 };
 
 // A list of structures that all share the prototype's shape.

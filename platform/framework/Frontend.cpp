@@ -55,7 +55,11 @@ CliOutcome RunCommand(const Invocation& inv, const DispatchHooks& hooks)
     }
     const OutputHints hints{inv.command->GetDefaultOutputFormatter(), inv.command->GetDefaultOutputParameters()};
     const auto declared = inv.outputSpec ? inv.outputSpec->GetRootObject() : nullptr;
-    outcome.out = RenderResult(out->GetRootObject(), declared, hints, inv.globals.output);
+    if (hooks.writeOut) {
+        RenderResultTo(hooks.writeOut, out->GetRootObject(), declared, hints, inv.globals.output);
+    } else {
+        outcome.out = RenderResult(out->GetRootObject(), declared, hints, inv.globals.output);
+    }
     for (const auto& message : out->GetErrorMessages()) {
         outcome.err += message + "\n";
     }

@@ -5,6 +5,7 @@
 #include <memory>
 #include <optional>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include "framework/Parser.h"
@@ -32,6 +33,9 @@ struct DispatchHooks {
     // The message of an exception the framework does not know by type (the host's); nothing
     // when the hook does not know it either.
     std::function<std::optional<std::string>(const std::exception_ptr&)> describeException;
+    // When set, a command's printed result goes here as it is produced instead of into
+    // CliOutcome::out, so a large result is never held as one text.
+    std::function<void(std::string_view)> writeOut;
 };
 
 std::string VersionText();

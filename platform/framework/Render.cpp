@@ -1,6 +1,7 @@
 #include "framework/Render.h"
 
 #include <algorithm>
+#include <charconv>
 
 #include <nlohmann/json.hpp>
 
@@ -80,35 +81,65 @@ std::shared_ptr<MetaStruct> ShapeOfValue(const std::shared_ptr<MetaObject>& valu
 }
 
 // The rows of a result: a list's elements, or the one structure.
-std::vector<std::shared_ptr<MetaStruct>> RowsOf(const std::shared_ptr<MetaObject>& result)
+struct Rows {
+    const std::shared_ptr<MetaStruct>* first = nullptr;
+    std::size_t count = 0;
+    std::shared_ptr<MetaStruct> single;
+
+    // A single structure is its own row (looked up on each call: Rows may be moved).
+    const std::shared_ptr<MetaStruct>* begin() const { return single ? &single : first; }
+    const std::shared_ptr<MetaStruct>* end() const { return begin() + count; }
+};
+
+Rows RowsOf(const std::shared_ptr<MetaObject>& result)
 {
-    if (auto list = std::dynamic_pointer_cast<MetaList>(result)) {
-        return list->GetElements();
+    Rows rows;
+    if (!result) {
+        return rows;
     }
-    if (auto single = std::dynamic_pointer_cast<MetaStruct>(result)) {
-        return {single};
+    if (result->GetType() == MetaType::List) {
+        if (auto* list = dynamic_cast<const MetaList*>(result.get())) {
+            rows.first = list->GetElements().data();
+            rows.count = list->GetElements().size();
+        }
+    } else if (auto single = std::dynamic_pointer_cast<MetaStruct>(result)) {
+        rows.single = std::move(single);
+        rows.count = 1;
     }
-    return {};
+    return rows;
 }
 
 // Every field title: the structure's, in its order, then any a row added beyond it.
-std::vector<std::string> AllFields(const std::shared_ptr<MetaStruct>& shape,
-                                   const std::vector<std::shared_ptr<MetaStruct>>& rows)
+std::vector<std::string> AllFields(const std::shared_ptr<MetaStruct>& shape, const Rows& rows)
 {
     std::vector<std::string> titles;
-    auto add = [&](const std::shared_ptr<MetaStruct>& structure) {
+    std::size_t lastCount = MetaStruct::npos;
+    auto add = [&](const MetaStruct* structure) {
         if (!structure) {
             return;
         }
-        for (const auto& field : structure->GetFields()) {
-            if (std::find(titles.begin(), titles.end(), field.first) == titles.end()) {
-                titles.push_back(field.first);
+        const std::size_t count = structure->GetFieldCount();
+        // Rows of one shape add nothing new: only their titles' positions need a look.
+        if (count == lastCount && count <= titles.size()) {
+            bool same = true;
+            for (std::size_t i = 0; i < count && same; ++i) {
+                same = structure->GetFieldTitle(i) == titles[i];
+            }
+            if (same) {
+                return;
+            }
+        }
+        lastCount = count;
+        for (std::size_t i = 0; i < count; ++i) {
+            const auto& title = structure->GetFieldTitle(i);
+            if (std::find(titles.begin(), titles.end(), title) == titles.end()) {
+                titles.push_back(title);
             }
         }
     };
-    add(shape);
+    add(shape.get());
     for (const auto& row : rows) {
-        add(row);
+        add(row.get());
     }
     return titles;
 }
@@ -128,83 +159,10 @@ std::vector<std::string> HintedFields(const std::string& hint, const std::vector
     return titles;
 }
 
-Cell MakeCell(const std::shared_ptr<MetaObject>& value)
-{
-    Cell cell;
-    if (!value) {
-        return cell;
-    }
-    cell.type = value->GetType();
-    switch (cell.type) {
-    case MetaType::Bool:
-        cell.boolean = static_cast<const MetaBool&>(*value).GetValue();
-        cell.text = cell.boolean ? "true" : "false";
-        break;
-    case MetaType::Int:
-        cell.number = static_cast<const MetaInt&>(*value).GetValue();
-        cell.text = std::to_string(cell.number);
-        break;
-    case MetaType::String:
-        cell.text = static_cast<const MetaString&>(*value).GetValue();
-        break;
-    default:
-        // Structures hold only plain values; anything else shows as empty text.
-        cell.type = MetaType::String;
-        break;
-    }
-    return cell;
-}
-
-// A field the row lacks shows the declared structure's empty value of its kind.
-Cell CellOf(const std::shared_ptr<MetaStruct>& row, const std::shared_ptr<MetaStruct>& shape, const std::string& title)
-{
-    auto value = row ? row->GetField(title) : nullptr;
-    if (!value && shape) {
-        value = shape->GetField(title);
-    }
-    return MakeCell(value);
-}
-
-// Replaces every %Field Title% by that field's value; unknown titles stay as written.
-std::string ExpandHeading(const std::string& pattern, const std::shared_ptr<MetaStruct>& row)
-{
-    std::string heading;
-    std::size_t pos = 0;
-    while (pos < pattern.size()) {
-        const auto open = pattern.find('%', pos);
-        if (open == std::string::npos) {
-            break;
-        }
-        const auto close = pattern.find('%', open + 1);
-        if (close == std::string::npos) {
-            break;
-        }
-        const auto title = pattern.substr(open + 1, close - open - 1);
-        heading += pattern.substr(pos, open - pos);
-        if (row && row->HasField(title)) {
-            heading += MakeCell(row->GetField(title)).text;
-            pos = close + 1;
-        } else {
-            heading += '%';
-            pos = open + 1;
-        }
-    }
-    heading += pattern.substr(pos);
-    return heading;
-}
-
 const std::string* FindHint(const OutputHints& hints, const std::string& key)
 {
     auto found = hints.parameters.find(key);
     return found == hints.parameters.end() ? nullptr : &found->second;
-}
-
-std::string RightTrim(std::string line)
-{
-    while (!line.empty() && line.back() == ' ') {
-        line.pop_back();
-    }
-    return line;
 }
 
 } // namespace
@@ -223,7 +181,7 @@ std::string CheckFieldSelection(const std::shared_ptr<MetaObject>& declared, con
     if (!shape) {
         return "this command's result has no fields to choose from";
     }
-    const auto known = AllFields(shape, {});
+    const auto known = AllFields(shape, Rows{});
     std::vector<std::string> seen;
     for (const auto& title : fields) {
         if (std::find(known.begin(), known.end(), title) == known.end()) {
@@ -238,37 +196,120 @@ std::string CheckFieldSelection(const std::shared_ptr<MetaObject>& declared, con
     return {};
 }
 
-ResultView BuildView(const std::shared_ptr<MetaObject>& result, const std::shared_ptr<MetaObject>& declared,
-                     const OutputHints& hints, const OutputOptions& options, Formatter formatter)
+
+namespace {
+
+// What the formatters print: the columns and where each column's value sits in a row.
+struct Layout {
+    enum class Shape { Nothing, Bool, Scalar, Single, List };
+
+    Shape shape = Shape::Nothing;
+    std::shared_ptr<MetaStruct> shape_;
+    Rows rows;
+    std::vector<std::string> titles;
+    std::vector<std::string> units; // "" for none
+    const std::string* header = nullptr;
+};
+
+// One value as printed: its kind and its text (numbers are written into `digits`).
+struct CellText {
+    MetaType type = MetaType::String;
+    bool boolean = false;
+    std::int64_t number = 0;
+    std::string_view text;
+    char digits[24];
+
+    CellText() = default;
+    CellText(const CellText&) = delete;
+    CellText& operator=(const CellText&) = delete;
+
+    void From(const MetaStruct::FieldRef& ref)
+    {
+        type = ref.type;
+        boolean = ref.boolean;
+        number = ref.number;
+        switch (type) {
+        case MetaType::Bool:
+            text = boolean ? "true" : "false";
+            break;
+        case MetaType::Int: {
+            const auto end = std::to_chars(digits, digits + sizeof digits, number).ptr;
+            text = std::string_view(digits, static_cast<std::size_t>(end - digits));
+            break;
+        }
+        case MetaType::String:
+            text = ref.text ? std::string_view(*ref.text) : std::string_view();
+            break;
+        default:
+            // Structures hold only plain values; anything else shows as empty text.
+            type = MetaType::String;
+            text = {};
+            break;
+        }
+    }
+};
+
+// Reads the cells of rows column by column; rows of one shape find their fields at once.
+class CellReader {
+public:
+    explicit CellReader(const Layout& layout) : layout_(layout), hints_(layout.titles.size(), 0) {}
+
+    // A field the row lacks shows the declared structure's empty value of its kind.
+    void Read(const MetaStruct* row, std::size_t column, CellText& cell)
+    {
+        const auto& title = layout_.titles[column];
+        if (row) {
+            const std::size_t at = row->FindField(title, hints_[column]);
+            if (at != MetaStruct::npos) {
+                hints_[column] = at;
+                cell.From(row->GetFieldRef(at));
+                return;
+            }
+        }
+        if (layout_.shape_) {
+            const std::size_t at = layout_.shape_->FindField(title);
+            if (at != MetaStruct::npos) {
+                cell.From(layout_.shape_->GetFieldRef(at));
+                return;
+            }
+        }
+        cell.From(MetaStruct::FieldRef{});
+    }
+
+private:
+    const Layout& layout_;
+    std::vector<std::size_t> hints_;
+};
+
+Layout Describe(const std::shared_ptr<MetaObject>& result, const std::shared_ptr<MetaObject>& declared,
+                const OutputHints& hints, const OutputOptions& options, Formatter formatter)
 {
-    ResultView view;
+    Layout layout;
     if (!result) {
-        return view;
+        return layout;
     }
     switch (result->GetType()) {
     case MetaType::Bool:
-        view.shape = ResultView::Shape::Bool;
-        view.boolValue = static_cast<const MetaBool&>(*result).GetValue();
-        return view;
+        layout.shape = Layout::Shape::Bool;
+        return layout;
     case MetaType::Int:
     case MetaType::String:
-        view.shape = ResultView::Shape::Scalar;
-        view.scalar = MakeCell(result);
-        return view;
+        layout.shape = Layout::Shape::Scalar;
+        return layout;
     case MetaType::Struct:
-        view.shape = ResultView::Shape::Single;
+        layout.shape = Layout::Shape::Single;
         break;
     case MetaType::List:
-        view.shape = ResultView::Shape::List;
+        layout.shape = Layout::Shape::List;
         break;
     }
 
-    const auto shape = RowShape(result, declared);
-    const auto rows = RowsOf(result);
-    const auto known = AllFields(shape, rows);
-    const std::string structName = shape ? shape->GetName() : std::string();
+    layout.shape_ = RowShape(result, declared);
+    layout.rows = RowsOf(result);
+    const auto known = AllFields(layout.shape_, layout.rows);
+    const std::string structName = layout.shape_ ? layout.shape_->GetName() : std::string();
 
-    std::vector<std::string> titles;
+    auto& titles = layout.titles;
     if (options.fields) {
         for (const auto& title : *options.fields) {
             if (std::find(titles.begin(), titles.end(), title) == titles.end()) {
@@ -281,230 +322,353 @@ ResultView BuildView(const std::shared_ptr<MetaObject>& result, const std::share
     if (titles.empty()) {
         titles = known;
     }
-
     for (const auto& title : titles) {
-        Column column{title, {}};
-        if (const auto* unit = FindHint(hints, "units:" + structName + "." + title)) {
-            column.unit = *unit;
-        }
-        view.columns.push_back(std::move(column));
+        const auto* unit = FindHint(hints, "units:" + structName + "." + title);
+        layout.units.push_back(unit ? *unit : std::string());
     }
-
-    const auto* header = FindHint(hints, "header:" + structName);
-    for (const auto& row : rows) {
-        ResultView::Row line;
-        if (header) {
-            line.heading = ExpandHeading(*header, row);
-        }
-        for (const auto& title : titles) {
-            line.cells.push_back(CellOf(row, shape, title));
-        }
-        view.rows.push_back(std::move(line));
-    }
-    return view;
+    layout.header = FindHint(hints, "header:" + structName);
+    return layout;
 }
 
-std::string RenderTable(const ResultView& view, bool showHeader)
+// The value of a scalar result, as a cell.
+void ScalarCell(const MetaObject& result, CellText& cell, std::string& text)
 {
-    if (view.shape == ResultView::Shape::Scalar) {
-        return Text::EscapeControl(view.scalar.text) + "\n";
+    MetaStruct::FieldRef ref;
+    ref.type = result.GetType();
+    if (ref.type == MetaType::Int) {
+        ref.number = static_cast<const MetaInt&>(result).GetValue();
+    } else {
+        text = static_cast<const MetaString&>(result).GetValue();
+        ref.text = &text;
     }
-    if ((view.shape != ResultView::Shape::Single && view.shape != ResultView::Shape::List) || view.columns.empty()) {
-        return {};
-    }
-    const std::size_t count = view.columns.size();
-    std::vector<std::vector<std::string>> cells;
-    for (const auto& row : view.rows) {
-        std::vector<std::string> line;
-        for (const auto& cell : row.cells) {
-            line.push_back(Text::EscapeControl(cell.text));
+    cell.From(ref);
+}
+
+// Replaces every %Field Title% by that field's value; unknown titles stay as written.
+std::string ExpandHeading(const std::string& pattern, const MetaStruct* row)
+{
+    std::string heading;
+    std::size_t pos = 0;
+    CellText cell;
+    while (pos < pattern.size()) {
+        const auto open = pattern.find('%', pos);
+        if (open == std::string::npos) {
+            break;
         }
-        cells.push_back(std::move(line));
-    }
-    std::vector<std::string> titles;
-    for (const auto& column : view.columns) {
-        titles.push_back(Text::EscapeControl(column.title));
-    }
-    std::vector<std::size_t> widths(count, 0);
-    auto measure = [&](const std::vector<std::string>& line) {
-        for (std::size_t i = 0; i < count; ++i) {
-            widths[i] = std::max(widths[i], Text::DisplayWidth(line[i]));
+        const auto close = pattern.find('%', open + 1);
+        if (close == std::string::npos) {
+            break;
         }
-    };
-    if (showHeader) {
-        measure(titles);
+        const auto title = pattern.substr(open + 1, close - open - 1);
+        heading += pattern.substr(pos, open - pos);
+        const std::size_t at = row ? row->FindField(title) : MetaStruct::npos;
+        if (at != MetaStruct::npos) {
+            cell.From(row->GetFieldRef(at));
+            heading += cell.text;
+            pos = close + 1;
+        } else {
+            heading += '%';
+            pos = open + 1;
+        }
     }
-    for (const auto& line : cells) {
-        measure(line);
+    heading += pattern.substr(pos);
+    return heading;
+}
+
+// Collects printed text and hands it on in large pieces.
+class Printer {
+public:
+    explicit Printer(const TextSink& sink) : sink_(sink) { buffer_.reserve(kChunk + 4096); }
+    ~Printer() { Flush(); }
+    Printer(const Printer&) = delete;
+    Printer& operator=(const Printer&) = delete;
+
+    std::string& Text() { return buffer_; }
+    // Call after each line: passes the text on once enough has gathered.
+    void Line()
+    {
+        if (buffer_.size() >= kChunk) {
+            Flush();
+        }
+    }
+    void Flush()
+    {
+        if (!buffer_.empty()) {
+            sink_(buffer_);
+            buffer_.clear();
+        }
     }
 
-    std::string out;
-    auto emit = [&](const std::vector<std::string>& line) {
-        std::string text;
+private:
+    static constexpr std::size_t kChunk = 64 * 1024;
+    const TextSink& sink_;
+    std::string buffer_;
+};
+
+void PrintTable(Printer& printer, const Layout& layout, bool showHeader)
+{
+    const std::size_t count = layout.titles.size();
+    if (count == 0) {
+        return;
+    }
+    // First pass: the width of every column, measured without keeping any cell.
+    std::vector<std::size_t> widths(count, 0);
+    if (showHeader) {
+        for (std::size_t i = 0; i < count; ++i) {
+            widths[i] = Text::EscapedWidth(layout.titles[i]);
+        }
+    }
+    CellReader reader(layout);
+    CellText cell;
+    for (const auto& row : layout.rows) {
+        for (std::size_t i = 0; i < count; ++i) {
+            reader.Read(row.get(), i, cell);
+            widths[i] = std::max(widths[i], Text::EscapedWidth(cell.text));
+        }
+    }
+
+    std::string& out = printer.Text();
+    // Cells are padded to their column's width; a line carries no blanks at its end.
+    auto emit = [&](auto&& cellText) {
+        const std::size_t start = out.size();
         for (std::size_t i = 0; i < count; ++i) {
             if (i != 0) {
-                text += "  ";
+                out += "  ";
             }
-            text += line[i];
-            text.append(widths[i] - Text::DisplayWidth(line[i]), ' ');
+            const std::string_view text = cellText(i);
+            Text::AppendEscaped(out, text);
+            out.append(widths[i] - Text::EscapedWidth(text), ' ');
         }
-        out += RightTrim(std::move(text)) + "\n";
+        while (out.size() > start && out.back() == ' ') {
+            out.pop_back();
+        }
+        out += '\n';
+        printer.Line();
     };
     if (showHeader) {
-        emit(titles);
-        std::vector<std::string> dashes;
-        for (const auto width : widths) {
-            dashes.emplace_back(width, '-');
-        }
-        emit(dashes);
+        emit([&](std::size_t i) { return std::string_view(layout.titles[i]); });
+        std::string dashes;
+        emit([&](std::size_t i) {
+            dashes.assign(widths[i], '-');
+            return std::string_view(dashes);
+        });
     }
-    for (const auto& line : cells) {
-        emit(line);
+    for (const auto& row : layout.rows) {
+        emit([&](std::size_t i) {
+            reader.Read(row.get(), i, cell);
+            return cell.text;
+        });
     }
-    return out;
 }
 
-std::string RenderSimple(const ResultView& view)
+void PrintSimple(Printer& printer, const Layout& layout)
 {
-    if (view.shape == ResultView::Shape::Scalar) {
-        return Text::EscapeControl(view.scalar.text) + "\n";
-    }
-    if (view.shape != ResultView::Shape::Single && view.shape != ResultView::Shape::List) {
-        return {};
-    }
-    std::string out;
+    std::string& out = printer.Text();
+    CellReader reader(layout);
+    CellText cell;
     bool first = true;
-    for (const auto& row : view.rows) {
+    for (const auto& row : layout.rows) {
         if (!first) {
-            out += "\n";
+            out += '\n';
         }
         first = false;
-        std::string indent = "   ";
-        if (row.heading) {
-            out += Text::EscapeControl(*row.heading) + "\n";
-            indent += "   ";
+        std::string_view indent = "   ";
+        if (layout.header) {
+            Text::AppendEscaped(out, ExpandHeading(*layout.header, row.get()));
+            out += '\n';
+            indent = "      ";
         }
-        for (std::size_t i = 0; i < view.columns.size(); ++i) {
-            const auto& column = view.columns[i];
-            std::string line = indent + Text::EscapeControl(column.title) + ": " + Text::EscapeControl(row.cells[i].text);
-            if (!column.unit.empty()) {
-                line += " " + column.unit;
+        for (std::size_t i = 0; i < layout.titles.size(); ++i) {
+            reader.Read(row.get(), i, cell);
+            out += indent;
+            Text::AppendEscaped(out, layout.titles[i]);
+            out += ": ";
+            Text::AppendEscaped(out, cell.text);
+            if (!layout.units[i].empty()) {
+                out += ' ';
+                out += layout.units[i];
             }
-            out += line + "\n";
+            out += '\n';
         }
+        printer.Line();
     }
-    return out;
 }
 
 // json prints one value, indented by two blanks, object keys in column order; text
 // that is not valid UTF-8 has its bad bytes replaced, so the output always parses.
-std::string RenderJson(const ResultView& view)
+using Json = nlohmann::ordered_json;
+
+Json CellJson(const CellText& cell)
 {
-    using Json = nlohmann::ordered_json;
-    auto cellJson = [](const Cell& cell) -> Json {
-        switch (cell.type) {
-        case MetaType::Bool:
-            return cell.boolean;
-        case MetaType::Int:
-            return cell.number;
-        default:
-            return cell.text;
-        }
-    };
-    auto rowJson = [&](const ResultView::Row& row) {
+    switch (cell.type) {
+    case MetaType::Bool:
+        return cell.boolean;
+    case MetaType::Int:
+        return cell.number;
+    default:
+        return std::string(cell.text);
+    }
+}
+
+std::string DumpJson(const Json& value)
+{
+    return value.dump(2, ' ', false, nlohmann::json::error_handler_t::replace);
+}
+
+void PrintJson(Printer& printer, const Layout& layout, const MetaObject& result)
+{
+    std::string& out = printer.Text();
+    CellReader reader(layout);
+    CellText cell;
+    auto rowJson = [&](const MetaStruct* row) {
         Json object = Json::object();
-        for (std::size_t i = 0; i < view.columns.size(); ++i) {
-            object[view.columns[i].title] = cellJson(row.cells[i]);
+        for (std::size_t i = 0; i < layout.titles.size(); ++i) {
+            reader.Read(row, i, cell);
+            object[layout.titles[i]] = CellJson(cell);
         }
         return object;
     };
 
-    Json value;
-    switch (view.shape) {
-    case ResultView::Shape::Nothing:
-        return {};
-    case ResultView::Shape::Bool:
-        value = view.boolValue;
+    switch (layout.shape) {
+    case Layout::Shape::Nothing:
+        return;
+    case Layout::Shape::Bool:
+        out += static_cast<const MetaBool&>(result).GetValue() ? "true" : "false";
         break;
-    case ResultView::Shape::Scalar:
-        value = cellJson(view.scalar);
-        break;
-    case ResultView::Shape::Single:
-        value = view.rows.empty() ? Json::object() : rowJson(view.rows.front());
-        break;
-    case ResultView::Shape::List:
-        value = Json::array();
-        for (const auto& row : view.rows) {
-            value.push_back(rowJson(row));
-        }
+    case Layout::Shape::Scalar: {
+        std::string text;
+        ScalarCell(result, cell, text);
+        out += DumpJson(CellJson(cell));
         break;
     }
-    return value.dump(2, ' ', false, nlohmann::json::error_handler_t::replace) + "\n";
+    case Layout::Shape::Single:
+        out += DumpJson(layout.rows.count == 0 ? Json::object() : rowJson(layout.rows.begin()->get()));
+        break;
+    case Layout::Shape::List:
+        if (layout.rows.count == 0) {
+            out += "[]";
+            break;
+        }
+        // The array is written element by element, each indented one level.
+        out += "[\n";
+        for (const auto& row : layout.rows) {
+            if (&row != layout.rows.begin()) {
+                out += ",\n";
+            }
+            out += "  ";
+            for (const char c : DumpJson(rowJson(row.get()))) {
+                out += c;
+                if (c == '\n') {
+                    out += "  ";
+                }
+            }
+            printer.Line();
+        }
+        out += "\n]";
+        break;
+    }
+    out += '\n';
 }
 
-namespace {
-
 // RFC 4180 quoting; lines end in a plain line feed, as scripts on this host expect.
-std::string CsvField(const std::string& text)
+void AppendCsvField(std::string& out, std::string_view text)
 {
-    if (text.find_first_of(",\"\r\n") == std::string::npos) {
-        return text;
+    if (text.find_first_of(",\"\r\n") == std::string_view::npos) {
+        out += text;
+        return;
     }
-    std::string quoted = "\"";
+    out += '"';
     for (const char c : text) {
         if (c == '"') {
-            quoted += '"';
+            out += '"';
         }
-        quoted += c;
+        out += c;
     }
-    return quoted + "\"";
+    out += '"';
+}
+
+void PrintCsv(Printer& printer, const Layout& layout, bool showHeader)
+{
+    const std::size_t count = layout.titles.size();
+    if (count == 0) {
+        return;
+    }
+    std::string& out = printer.Text();
+    auto emit = [&](auto&& cellText) {
+        for (std::size_t i = 0; i < count; ++i) {
+            if (i != 0) {
+                out += ',';
+            }
+            AppendCsvField(out, cellText(i));
+        }
+        out += '\n';
+        printer.Line();
+    };
+    if (showHeader) {
+        emit([&](std::size_t i) { return std::string_view(layout.titles[i]); });
+    }
+    CellReader reader(layout);
+    CellText cell;
+    for (const auto& row : layout.rows) {
+        emit([&](std::size_t i) {
+            reader.Read(row.get(), i, cell);
+            return cell.text;
+        });
+    }
 }
 
 } // namespace
 
-std::string RenderCsv(const ResultView& view, bool showHeader)
+void RenderResultTo(const TextSink& sink, const std::shared_ptr<MetaObject>& result,
+                    const std::shared_ptr<MetaObject>& declared, const OutputHints& hints,
+                    const OutputOptions& options)
 {
-    if (view.shape == ResultView::Shape::Scalar) {
-        return CsvField(view.scalar.text) + "\n";
+    const Formatter formatter = EffectiveFormatter(hints, options);
+    const Layout layout = Describe(result, declared, hints, options, formatter);
+    if (layout.shape == Layout::Shape::Nothing) {
+        return;
     }
-    if ((view.shape != ResultView::Shape::Single && view.shape != ResultView::Shape::List) || view.columns.empty()) {
-        return {};
+    Printer printer(sink);
+    if (formatter == Formatter::Json) {
+        PrintJson(printer, layout, *result);
+        return;
     }
-    std::string out;
-    auto emit = [&](auto&& textOf) {
-        for (std::size_t i = 0; i < view.columns.size(); ++i) {
-            if (i != 0) {
-                out += ",";
-            }
-            out += CsvField(textOf(i));
+    if (layout.shape == Layout::Shape::Scalar) {
+        CellText cell;
+        std::string text;
+        ScalarCell(*result, cell, text);
+        if (formatter == Formatter::Csv) {
+            AppendCsvField(printer.Text(), cell.text);
+        } else {
+            Text::AppendEscaped(printer.Text(), cell.text);
         }
-        out += "\n";
-    };
-    if (showHeader) {
-        emit([&](std::size_t i) -> const std::string& { return view.columns[i].title; });
+        printer.Text() += '\n';
+        return;
     }
-    for (const auto& row : view.rows) {
-        emit([&](std::size_t i) -> const std::string& { return row.cells[i].text; });
+    if (layout.shape == Layout::Shape::Bool) {
+        return;
     }
-    return out;
+    switch (formatter) {
+    case Formatter::Table:
+        PrintTable(printer, layout, options.showHeader);
+        break;
+    case Formatter::Simple:
+        PrintSimple(printer, layout);
+        break;
+    case Formatter::Csv:
+        PrintCsv(printer, layout, options.showHeader);
+        break;
+    case Formatter::Json:
+        break;
+    }
 }
 
 std::string RenderResult(const std::shared_ptr<MetaObject>& result, const std::shared_ptr<MetaObject>& declared,
                          const OutputHints& hints, const OutputOptions& options)
 {
-    const Formatter formatter = EffectiveFormatter(hints, options);
-    const ResultView view = BuildView(result, declared, hints, options, formatter);
-    switch (formatter) {
-    case Formatter::Table:
-        return RenderTable(view, options.showHeader);
-    case Formatter::Simple:
-        return RenderSimple(view);
-    case Formatter::Json:
-        return RenderJson(view);
-    case Formatter::Csv:
-        return RenderCsv(view, options.showHeader);
-    }
-    return {};
+    std::string out;
+    RenderResultTo([&](std::string_view text) { out += text; }, result, declared, hints, options);
+    return out;
 }
 
 } // namespace Quillets::Cli

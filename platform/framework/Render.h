@@ -1,10 +1,12 @@
 #pragma once
 
 #include <cstdint>
+#include <functional>
 #include <map>
 #include <memory>
 #include <optional>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include "quillets/MetaObj.h"
@@ -12,8 +14,8 @@
 // Turning a command's result into text. The renderers know no command: they work from
 // the result, the declared output structure and the presentation hints only.
 //
-// Each result is first described once as a ResultView (its shape, its columns in display
-// order with their units, and its rows of cells); every formatter prints from that view.
+// Each result is first described by its columns (display order, units) and its rows; every
+// formatter then prints the rows one by one, reading each cell where the result holds it.
 namespace Quillets::Cli {
 
 enum class Formatter { Table, Simple, Json, Csv };
@@ -35,32 +37,6 @@ struct OutputOptions {
     bool showHeader = true;
 };
 
-struct Cell {
-    MetaObj::MetaType type = MetaObj::MetaType::String;
-    std::string text; // strings; also the printed form of every kind
-    bool boolean = false;
-    std::int64_t number = 0;
-};
-
-struct Column {
-    std::string title;
-    std::string unit; // from a "units:" hint, "" for none
-};
-
-struct ResultView {
-    enum class Shape { Nothing, Bool, Scalar, Single, List };
-    struct Row {
-        std::optional<std::string> heading; // from a "header:" hint
-        std::vector<Cell> cells;            // one per column
-    };
-
-    Shape shape = Shape::Nothing;
-    bool boolValue = false;
-    Cell scalar;
-    std::vector<Column> columns;
-    std::vector<Row> rows;
-};
-
 // The formatter that applies: the user's, else the command's default, else simple.
 // An unknown default falls back to simple; the user's name must have been checked.
 Formatter EffectiveFormatter(const OutputHints& hints, const OutputOptions& options);
@@ -75,16 +51,15 @@ std::shared_ptr<MetaObj::MetaStruct> RowShape(const std::shared_ptr<MetaObj::Met
 std::string CheckFieldSelection(const std::shared_ptr<MetaObj::MetaObject>& declared,
                                 const std::vector<std::string>& fields);
 
-// Describes `result` for `formatter`: columns come from the user's fields, else (except
-// for json, which shows every field) the "fields:" hint, else every field in structure order.
-ResultView BuildView(const std::shared_ptr<MetaObj::MetaObject>& result,
-                     const std::shared_ptr<MetaObj::MetaObject>& declared, const OutputHints& hints,
-                     const OutputOptions& options, Formatter formatter);
+// Receives printed text piece by piece, in order.
+using TextSink = std::function<void(std::string_view)>;
 
-std::string RenderTable(const ResultView& view, bool showHeader);
-std::string RenderSimple(const ResultView& view);
-std::string RenderJson(const ResultView& view);
-std::string RenderCsv(const ResultView& view, bool showHeader);
+// Prints a result to `sink` as it goes, so that a large result is never held as text.
+// Columns come from the user's fields, else (except for json, which shows every field) the
+// "fields:" hint, else every field in structure order.
+void RenderResultTo(const TextSink& sink, const std::shared_ptr<MetaObj::MetaObject>& result,
+                    const std::shared_ptr<MetaObj::MetaObject>& declared, const OutputHints& hints,
+                    const OutputOptions& options);
 
 // Everything autocli prints on standard output for a result ("" when nothing).
 std::string RenderResult(const std::shared_ptr<MetaObj::MetaObject>& result,

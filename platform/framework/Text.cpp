@@ -2,28 +2,48 @@
 
 namespace Quillets::Cli::Text {
 
-std::string EscapeControl(const std::string& text)
+void AppendEscaped(std::string& out, std::string_view text)
 {
     static const char* const kHex = "0123456789abcdef";
-    std::string escaped;
-    escaped.reserve(text.size());
     for (const char c : text) {
         const auto byte = static_cast<unsigned char>(c);
         if (byte >= 0x20 && byte != 0x7f) {
-            escaped += c;
+            out += c;
         } else if (c == '\n') {
-            escaped += "\\n";
+            out += "\\n";
         } else if (c == '\t') {
-            escaped += "\\t";
+            out += "\\t";
         } else if (c == '\r') {
-            escaped += "\\r";
+            out += "\\r";
         } else {
-            escaped += "\\x";
-            escaped += kHex[byte >> 4];
-            escaped += kHex[byte & 0xf];
+            out += "\\x";
+            out += kHex[byte >> 4];
+            out += kHex[byte & 0xf];
         }
     }
+}
+
+std::string EscapeControl(const std::string& text)
+{
+    std::string escaped;
+    escaped.reserve(text.size());
+    AppendEscaped(escaped, text);
     return escaped;
+}
+
+std::size_t EscapedWidth(std::string_view text)
+{
+    std::size_t width = 0;
+    for (const char c : text) {
+        const auto byte = static_cast<unsigned char>(c);
+        if (byte < 0x20 || byte == 0x7f) {
+            // Escapes are plain ASCII: \n, \t, \r take two columns, \xHH four.
+            width += (c == '\n' || c == '\t' || c == '\r') ? 2 : 4;
+        } else if ((byte & 0xc0) != 0x80) {
+            ++width;
+        }
+    }
+    return width;
 }
 
 std::size_t DisplayWidth(const std::string& text)

@@ -7,6 +7,7 @@
 #include <nlohmann/json.hpp>
 
 #include "FakeCommand.h"
+#include "framework/Text.h"
 #include "framework/TreeWalk.h"
 #include "quillets/QuilletException.h"
 
@@ -52,6 +53,35 @@ TEST(Values, StructKeepsFirstOrderAndReplacesInPlace)
     EXPECT_EQ(row->GetFields()[0].first, "B");
     EXPECT_EQ(row->GetField("B")->GetType(), MetaType::Bool);
     EXPECT_EQ(row->GetField("C"), nullptr);
+}
+
+TEST(Values, FieldObjectsFollowChangesAndKeepGivenObjects)
+{
+    auto row = MetaStruct::New("Row");
+    const auto given = MetaString::New("kept");
+    row->SetField("A", given);
+    row->SetField("B", 5);
+    EXPECT_EQ(row->GetField("A"), given);
+    EXPECT_EQ(std::static_pointer_cast<MetaInt>(row->GetFields()[1].second)->GetValue(), 5);
+    row->SetField("B", "five");
+    row->SetField("C", std::shared_ptr<MetaInt>());
+    ASSERT_EQ(row->GetFields().size(), 3u);
+    EXPECT_EQ(std::static_pointer_cast<MetaString>(row->GetField("B"))->GetValue(), "five");
+    EXPECT_EQ(row->GetFields()[2].second->GetType(), MetaType::Int);
+    const auto ref = row->GetFieldRef(row->FindField("A", 2));
+    ASSERT_NE(ref.text, nullptr);
+    EXPECT_EQ(*ref.text, "kept");
+    EXPECT_EQ(row->FindField("D"), MetaStruct::npos);
+}
+
+TEST(Text, EscapedWidthIsTheWidthOfTheEscapedText)
+{
+    for (const std::string& text : {std::string(), std::string("plain"), std::string("a\tb\n"), std::string("\x01\x7f", 2),
+                                   std::string("\xc3\xa9t\xc3\xa9\r")}) {
+        EXPECT_EQ(Quillets::Cli::Text::EscapedWidth(text),
+                  Quillets::Cli::Text::DisplayWidth(Quillets::Cli::Text::EscapeControl(text)))
+            << text;
+    }
 }
 
 TEST(Values, OutputAndHintsKeepWhatTheCommandSaidLast)

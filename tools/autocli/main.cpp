@@ -12,6 +12,7 @@
 #include <optional>
 #include <stdexcept>
 #include <string>
+#include <string_view>
 #include <system_error>
 #include <vector>
 
@@ -45,6 +46,7 @@ DispatchHooks Hooks()
     DispatchHooks hooks;
     hooks.dumpState = [] { return HostSim::DumpState(); };
     hooks.describeException = DescribeHostException;
+    hooks.writeOut = [](std::string_view text) { std::fwrite(text.data(), 1, text.size(), stdout); };
     return hooks;
 }
 
