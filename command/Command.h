@@ -47,6 +47,13 @@ using KnxCtl::Storage::StorageInfoImpl;
 using InputPtr = std::shared_ptr<Input>;
 using OutputPtr = std::shared_ptr<Output>;
 
+// Option names that several commands share.
+inline constexpr const char* kOptionVolumeLabel = "volume-label";
+inline constexpr const char* kOptionVolumeUuid = "volume-uuid";
+inline constexpr const char* kOptionVolumeName = "volume-name";
+inline constexpr const char* kOptionNoPersist = "no-persist";
+inline constexpr const char* kOptionIgnoreErrors = "ignore-errors";
+
 // Host feature switches the plug-in reads; read afresh at every use, never cached.
 enum class Feature : int {
     Nfs41KnxnicBinding = 102,

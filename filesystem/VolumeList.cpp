@@ -16,7 +16,6 @@ const char* const kSize = "Size";
 const char* const kFree = "Free";
 
 const char* const kUuidParameter = "uuid";
-const char* const kIgnoreErrors = "ignore-errors";
 
 } // namespace
 
@@ -57,7 +56,7 @@ std::shared_ptr<MetaStruct> VolumeList::GetOutputStructure()
 
 void VolumeList::ExecuteInternal(const InputPtr& in, const OutputPtr& out)
 {
-    const char ignoreErrors = in->IsFlagSet(kIgnoreErrors) ? 1 : 0;
+    const char ignoreErrors = in->IsFlagSet(kOptionIgnoreErrors) ? 1 : 0;
 
     WithStorageInfo(StorageInfoPlacement::InsideGuard, out, [&](StorageInfoImpl& storage) {
         auto list = MetaList::New(MetaType::Struct, GetOutputStructure());

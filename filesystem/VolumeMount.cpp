@@ -8,11 +8,7 @@ namespace {
 
 using HostCtl::Storage::FileSystem;
 using FileSystemPtr = std::unique_ptr<HostCtl::Storage::FileSystem>;
-
-const char* const kVolumeLabel = "volume-label";
 const char* const kVolumePath = "volume-path";
-const char* const kVolumeUuid = "volume-uuid";
-const char* const kNoPersist = "no-persist";
 const char* const kUnmountAllHlfs = "unmount-all-hlfs";
 
 const char* const kPreUnmount = "PreUnmount";
@@ -23,7 +19,7 @@ constexpr int kUnmountBusy = 1;
 
 FileSystem::MountOperationOption MountOption(const InputPtr& in)
 {
-    return in->IsFlagSet(kNoPersist) ? FileSystem::MOUNT_UNTIL_RESTART : FileSystem::MOUNT_PERSISTENT;
+    return in->IsFlagSet(kOptionNoPersist) ? FileSystem::MOUNT_UNTIL_RESTART : FileSystem::MOUNT_PERSISTENT;
 }
 
 std::string BusyMessage(const std::string& name) { return "Volume '" + name + "' cannot be unmounted. Reason: Busy"; }
@@ -166,13 +162,13 @@ VolumeMount::~VolumeMount() = default;
 std::shared_ptr<InputSpec> VolumeMount::GetInputSpecInternal()
 {
     auto inputs = InputSpec::New();
-    AddParameter(inputs, {kVolumeLabel, "l", ParameterType::String,
+    AddParameter(inputs, {kOptionVolumeLabel, "l", ParameterType::String,
                         "The label of the volume to mount. This volume must be unmounted for this operation to "
                         "succeed."});
-    AddParameter(inputs, {kVolumeUuid, "u", ParameterType::String,
+    AddParameter(inputs, {kOptionVolumeUuid, "u", ParameterType::String,
                         "The UUID of the HLFS filesystem to mount. This volume must be unmounted for this operation "
                         "to succeed."});
-    AddParameter(inputs, {kNoPersist, "n", ParameterType::Flag,
+    AddParameter(inputs, {kOptionNoPersist, "n", ParameterType::Flag,
                         "Mount the volume non-persistently; the volume will not be mounted after a restart."});
     return inputs;
 }
@@ -181,8 +177,8 @@ std::shared_ptr<OutputSpec> VolumeMount::GetOutputSpecInternal() { return Boolea
 
 void VolumeMount::ExecuteInternal(const InputPtr& in, const OutputPtr& out)
 {
-    const std::string uuid = in->GetParameter(kVolumeUuid);
-    const std::string label = in->GetParameter(kVolumeLabel);
+    const std::string uuid = in->GetParameter(kOptionVolumeUuid);
+    const std::string label = in->GetParameter(kOptionVolumeLabel);
     StorageInfoImpl storage;
     const FileSystem::MountOperationOption option = MountOption(in);
 
@@ -242,10 +238,10 @@ VolumeUnmount::~VolumeUnmount() = default;
 std::shared_ptr<InputSpec> VolumeUnmount::GetInputSpecInternal()
 {
     auto inputs = InputSpec::New();
-    AddParameter(inputs, {kVolumeLabel, "l", ParameterType::String, "The label of the volume to unmount."});
+    AddParameter(inputs, {kOptionVolumeLabel, "l", ParameterType::String, "The label of the volume to unmount."});
     AddParameter(inputs, {kVolumePath, "p", ParameterType::String, "The path of the volume to unmount."});
-    AddParameter(inputs, {kVolumeUuid, "u", ParameterType::String, "The uuid of the volume to unmount."});
-    AddParameter(inputs, {kNoPersist, "n", ParameterType::Flag,
+    AddParameter(inputs, {kOptionVolumeUuid, "u", ParameterType::String, "The uuid of the volume to unmount."});
+    AddParameter(inputs, {kOptionNoPersist, "n", ParameterType::Flag,
                         "Unmount the volume non-persistently; the volume will be automounted after a restart."});
     AddParameter(inputs, {kUnmountAllHlfs, "a", ParameterType::Flag, "Unmount all hlfs volumes."});
     return inputs;
@@ -255,9 +251,9 @@ std::shared_ptr<OutputSpec> VolumeUnmount::GetOutputSpecInternal() { return Bool
 
 void VolumeUnmount::ExecuteInternal(const InputPtr& in, const OutputPtr& out)
 {
-    const std::string label = in->GetParameter(kVolumeLabel);
+    const std::string label = in->GetParameter(kOptionVolumeLabel);
     const std::string path = in->GetParameter(kVolumePath);
-    const std::string uuid = in->GetParameter(kVolumeUuid);
+    const std::string uuid = in->GetParameter(kOptionVolumeUuid);
     const FileSystem::MountOperationOption option = MountOption(in);
     const bool all = in->IsFlagSet(kUnmountAllHlfs);
 

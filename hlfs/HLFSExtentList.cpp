@@ -14,8 +14,6 @@ const char* const kDeviceName = "Device Name";
 const char* const kPartition = "Partition";
 const char* const kExtentNumber = "Extent Number";
 
-const char* const kIgnoreErrors = "ignore-errors";
-
 } // namespace
 
 std::shared_ptr<HLFSExtentList> HLFSExtentList::New() { return std::shared_ptr<HLFSExtentList>(new HLFSExtentList()); }
@@ -52,7 +50,7 @@ std::shared_ptr<MetaStruct> HLFSExtentList::GetOutputStructure()
 
 void HLFSExtentList::ExecuteInternal(const InputPtr& in, const OutputPtr& out)
 {
-    const char ignoreErrors = in->IsFlagSet(kIgnoreErrors) ? 1 : 0;
+    const char ignoreErrors = in->IsFlagSet(kOptionIgnoreErrors) ? 1 : 0;
 
     WithStorageInfo(StorageInfoPlacement::InsideGuard, out, [&](StorageInfoImpl& storage) {
         auto list = MetaList::New(MetaType::Struct, GetOutputStructure());

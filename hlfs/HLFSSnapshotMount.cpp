@@ -60,7 +60,7 @@ std::shared_ptr<InputSpec> HLFSSnapshotMount::GetInputSpecInternal()
     auto inputs = InputSpec::New();
     AddSnapshotSelectionParameters(inputs, "The HLFS volume label of the snapshot to mount.",
                                    "The HLFS volume uuid of the snapshot to mount.");
-    AddParameter(inputs, {"no-persist", "n", ParameterType::Flag,
+    AddParameter(inputs, {kOptionNoPersist, "n", ParameterType::Flag,
                         "Mount the volume non-persistently; the volume will not be automounted after a restart."});
     return inputs;
 }
@@ -69,7 +69,7 @@ std::shared_ptr<OutputSpec> HLFSSnapshotMount::GetOutputSpecInternal() { return 
 
 void HLFSSnapshotMount::ExecuteInternal(const InputPtr& in, const OutputPtr& out)
 {
-    const bool persistent = !in->IsFlagSet("no-persist");
+    const bool persistent = !in->IsFlagSet(kOptionNoPersist);
     // No CanResolve check first: a copy that cannot be mounted fails in the host.
     ResolveMatchingSnapshots(in, out, [&](UnresolvedHlfsVolumeImpl& volume) { volume.Mount(false, persistent); });
 }

@@ -151,7 +151,7 @@ void HLFSVolumeLockModeList::UpdateFilesystemList(const std::vector<std::unique_
 
 void HLFSVolumeLockModeList::ExecuteInternal(const InputPtr& in, const OutputPtr& out)
 {
-    const bool ignoreErrors = in->IsFlagSet("ignore-errors");
+    const bool ignoreErrors = in->IsFlagSet(kOptionIgnoreErrors);
     Guarded(out, [&] {
         const std::optional<bool> onlineUpgradeEnabled = ReadOnlineUpgradeEnabled(out);
         if (!onlineUpgradeEnabled) {

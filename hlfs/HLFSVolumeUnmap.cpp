@@ -8,9 +8,6 @@ using HostCtl::Misc::StrCat;
 using KnxCtl::Storage::HlFileSystemImpl;
 
 namespace {
-
-constexpr const char* kLabelParameter = "volume-label";
-constexpr const char* kUuidParameter = "volume-uuid";
 constexpr const char* kReclaimUnitParameter = "reclaim-unit";
 
 constexpr std::int64_t kDefaultReclaimUnit = 200;
@@ -20,8 +17,8 @@ constexpr std::int64_t kMaxReclaimUnit = std::numeric_limits<std::uint32_t>::max
 std::shared_ptr<InputSpec> VolumeChoiceInputSpec(const char* labelDescription, const char* uuidDescription)
 {
     auto inputs = InputSpec::New();
-    AddParameter(inputs, {kLabelParameter, "l", ParameterType::String, labelDescription});
-    AddParameter(inputs, {kUuidParameter, "u", ParameterType::String, uuidDescription});
+    AddParameter(inputs, {kOptionVolumeLabel, "l", ParameterType::String, labelDescription});
+    AddParameter(inputs, {kOptionVolumeUuid, "u", ParameterType::String, uuidDescription});
     return inputs;
 }
 
@@ -74,8 +71,8 @@ std::shared_ptr<OutputSpec> HLFSVolumeUpgrade::GetOutputSpecInternal() { return 
 
 void HLFSVolumeUpgrade::ExecuteInternal(const InputPtr& in, const OutputPtr& out)
 {
-    const std::string label = in->GetParameter(kLabelParameter);
-    const std::string uuid = in->GetParameter(kUuidParameter);
+    const std::string label = in->GetParameter(kOptionVolumeLabel);
+    const std::string uuid = in->GetParameter(kOptionVolumeUuid);
     Guarded(out, [&] {
         const std::string identifier = ChooseVolume(label, uuid, out);
         if (identifier.empty()) {
@@ -107,8 +104,8 @@ std::shared_ptr<OutputSpec> HLFSVolumeUnmap::GetOutputSpecInternal() { return Bo
 
 void HLFSVolumeUnmap::ExecuteInternal(const InputPtr& in, const OutputPtr& out)
 {
-    const std::string label = in->GetParameter(kLabelParameter);
-    const std::string uuid = in->GetParameter(kUuidParameter);
+    const std::string label = in->GetParameter(kOptionVolumeLabel);
+    const std::string uuid = in->GetParameter(kOptionVolumeUuid);
     Guarded(out, [&] {
         const std::string identifier = ChooseVolume(label, uuid, out);
         if (identifier.empty()) {

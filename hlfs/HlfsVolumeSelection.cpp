@@ -4,10 +4,6 @@ namespace OrvaneCli::FileSystem {
 
 namespace {
 
-const char* const kVolumeLabel = "volume-label";
-const char* const kVolumeUuid = "volume-uuid";
-const char* const kIgnoreErrors = "ignore-errors";
-
 const char* const kLabelDescription = "The label of the target HLFS volume.";
 const char* const kUuidDescription = "The uuid of the target HLFS volume.";
 
@@ -22,31 +18,31 @@ std::unique_ptr<HostCtl::Storage::StorageInfo> OpenStorageInfo()
 
 std::shared_ptr<ParameterSpec> IgnoreErrorInputParameter()
 {
-    return MakeParameter({kIgnoreErrors, "i", ParameterType::Flag,
+    return MakeParameter({kOptionIgnoreErrors, "i", ParameterType::Flag,
                           "Ignore errors encountered (if any) while retrieving information for each file system."});
 }
 
 std::shared_ptr<InputSpec> GetSingleHLFSVolumeInputSpec()
 {
     auto inputs = InputSpec::New();
-    AddParameter(inputs, {kVolumeLabel, "l", ParameterType::String, kLabelDescription});
-    AddParameter(inputs, {kVolumeUuid, "u", ParameterType::String, kUuidDescription});
+    AddParameter(inputs, {kOptionVolumeLabel, "l", ParameterType::String, kLabelDescription});
+    AddParameter(inputs, {kOptionVolumeUuid, "u", ParameterType::String, kUuidDescription});
     return inputs;
 }
 
 std::shared_ptr<InputSpec> GetMultipleHLFSVolumesInputSpec()
 {
     auto inputs = InputSpec::New();
-    AddParameter(inputs, {kVolumeLabel, "l", ParameterType::StringList, kLabelDescription});
-    AddParameter(inputs, {kVolumeUuid, "u", ParameterType::StringList, kUuidDescription});
+    AddParameter(inputs, {kOptionVolumeLabel, "l", ParameterType::StringList, kLabelDescription});
+    AddParameter(inputs, {kOptionVolumeUuid, "u", ParameterType::StringList, kUuidDescription});
     inputs->AddParameter(IgnoreErrorInputParameter());
     return inputs;
 }
 
 std::unique_ptr<HlFileSystem> GetSingleHLFSVolume(const InputPtr& in, const OutputPtr& out)
 {
-    const std::string label = in->GetParameter(kVolumeLabel);
-    const std::string uuid = in->GetParameter(kVolumeUuid);
+    const std::string label = in->GetParameter(kOptionVolumeLabel);
+    const std::string uuid = in->GetParameter(kOptionVolumeUuid);
 
     if (IsGiven(label) && IsGiven(uuid)) {
         out->AddErrorMessage("You cannot specify both --volume-label and --volume-uuid.");
@@ -74,9 +70,9 @@ bool GetMultipleHLFSVolumes(const InputPtr& in, const OutputPtr& out,
 {
     std::vector<std::string> labels;
     std::vector<std::string> uuids;
-    in->GetParameterList(kVolumeLabel, labels);
-    in->GetParameterList(kVolumeUuid, uuids);
-    const bool ignore = in->IsFlagSet(kIgnoreErrors);
+    in->GetParameterList(kOptionVolumeLabel, labels);
+    in->GetParameterList(kOptionVolumeUuid, uuids);
+    const bool ignore = in->IsFlagSet(kOptionIgnoreErrors);
 
     bool ok = true;
     const bool completed = Guarded(out, [&] {

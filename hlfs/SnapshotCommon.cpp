@@ -22,13 +22,13 @@ const char* TranslateSnapshotReason(unsigned code)
 void AddSnapshotSelectionParameters(const std::shared_ptr<InputSpec>& inputs, const char* labelDescription,
                                     const char* uuidDescription)
 {
-    AddParameter(inputs, {"volume-label", "l", ParameterType::String, labelDescription});
-    AddParameter(inputs, {"volume-uuid", "u", ParameterType::String, uuidDescription});
+    AddParameter(inputs, {kOptionVolumeLabel, "l", ParameterType::String, labelDescription});
+    AddParameter(inputs, {kOptionVolumeUuid, "u", ParameterType::String, uuidDescription});
 }
 
 SnapshotSelection SnapshotSelection::FromInput(const InputPtr& in)
 {
-    return {in->GetParameter("volume-label"), in->GetParameter("volume-uuid")};
+    return {in->GetParameter(kOptionVolumeLabel), in->GetParameter(kOptionVolumeUuid)};
 }
 
 bool SnapshotSelection::Matches(UnresolvedHlfsVolumeImpl& volume) const

@@ -56,7 +56,7 @@ std::shared_ptr<InputSpec> NFS41VolumeAdd::GetInputSpecInternal()
                  {NfsAddArg::kIsPE, "p", ParameterType::Flag, "If set, this flag will set the mount point to be PE."});
     AddParameter(inputs, {NfsAddArg::kShare, "s", ParameterType::String,
                         "The share name on the remote system to use for this NFS v4.1 mount point.", true});
-    AddParameter(inputs, {NfsAddArg::kVolumeName, "v", ParameterType::String,
+    AddParameter(inputs, {kOptionVolumeName, "v", ParameterType::String,
                         "The volume name to use for the NFS v4.1 mount.  This must be a unique volume name and "
                         "cannot conflict with existing NAS, NFS v4.1, HLFS, or other volume names.",
                         true});
@@ -97,7 +97,7 @@ void NFS41VolumeAdd::ExecuteInternal(const InputPtr& in, const OutputPtr& out)
     }
 
     const std::string& share = in->GetParameter(NfsAddArg::kShare);
-    const std::string& volumeName = in->GetParameter(NfsAddArg::kVolumeName);
+    const std::string& volumeName = in->GetParameter(kOptionVolumeName);
     const bool readOnly = in->IsFlagSet(NfsAddArg::kReadOnly);
     const NetworkFileSystem::SecurityType security = ToSecurityType(in->GetParameter(kSecurity));
     const bool isPE = in->IsFlagSet(NfsAddArg::kIsPE);

@@ -70,7 +70,7 @@ std::shared_ptr<InputSpec> NFSVolumeAdd::GetInputSpecInternal()
     }
     AddParameter(inputs, {NfsAddArg::kShare, "s", ParameterType::String,
                         "The share name on the remote system to use for this NAS mount point.", true});
-    AddParameter(inputs, {NfsAddArg::kVolumeName, "v", ParameterType::String,
+    AddParameter(inputs, {kOptionVolumeName, "v", ParameterType::String,
                         "The volume name to use for the NAS mount.  This must be a unique volume name and cannot "
                         "conflict with existing NAS, HLFS or other volume names.",
                         true});
@@ -95,7 +95,7 @@ std::shared_ptr<OutputSpec> NFSVolumeAdd::GetOutputSpecInternal() { return Boole
 void NFSVolumeAdd::ExecuteInternal(const InputPtr& in, const OutputPtr& out)
 {
     const std::string& share = in->GetParameter(NfsAddArg::kShare);
-    const std::string& volumeName = in->GetParameter(NfsAddArg::kVolumeName);
+    const std::string& volumeName = in->GetParameter(kOptionVolumeName);
     const bool readOnly = in->IsFlagSet(NfsAddArg::kReadOnly);
 
     std::int64_t connections = 1;

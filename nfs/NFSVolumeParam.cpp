@@ -7,8 +7,6 @@
 namespace OrvaneCli::FileSystem {
 
 namespace {
-
-constexpr const char* kVolumeName = "volume-name";
 constexpr const char* kMaxQueueDepth = "maxqueuedepth";
 constexpr const char* kKnxnic = "knxnic";
 constexpr const char* kConnections = "connections";
@@ -61,7 +59,7 @@ constexpr const char* kBaseParamFields = "Volume Name, MaxQueueDepth, MaxReadTra
 std::shared_ptr<InputSpec> VolumeNameInputSpec(const char* description)
 {
     auto inputs = InputSpec::New();
-    AddParameter(inputs, {kVolumeName, "v", ParameterType::String, description, true});
+    AddParameter(inputs, {kOptionVolumeName, "v", ParameterType::String, description, true});
     return inputs;
 }
 
@@ -180,7 +178,7 @@ void NFSVolumeParamGet::ExecuteInternal(const InputPtr& in, const OutputPtr& out
 {
     const V3ParamFeatures features;
     ListVolumeParams(
-        in->GetParameter(kVolumeName), NonPEV3Volumes, out,
+        in->GetParameter(kOptionVolumeName), NonPEV3Volumes, out,
         [&] { return MakeV3ParamRow(features); },
         [&](NetworkFileSystem& volume, MetaStruct& row) {
             if (features.knxnic) {
@@ -229,7 +227,7 @@ void NFSVolumeParamSet::ExecuteInternal(const InputPtr& in, const OutputPtr& out
     const std::string& knxnic = in->GetParameter(kKnxnic);
     const bool setKnxnic = features.knxnic && IsGiven(knxnic);
     const bool setConnections = features.connections && in->HasParameter(kConnections);
-    SetVolumeParams(in->GetParameter(kVolumeName), NonPEV3Volumes, "NAS", out,
+    SetVolumeParams(in->GetParameter(kOptionVolumeName), NonPEV3Volumes, "NAS", out,
                     [&](NetworkFileSystem& volume) {
                         ApplyMaxQueueDepth(in, volume);
                         if (setKnxnic) {
@@ -280,7 +278,7 @@ void NFS41VolumeParamGet::ExecuteInternal(const InputPtr& in, const OutputPtr& o
 {
     const bool knxnics = IsFeatureEnabled(Feature::Nfs41KnxnicBinding);
     ListVolumeParams(
-        in->GetParameter(kVolumeName), NonPEV41Volumes, out,
+        in->GetParameter(kOptionVolumeName), NonPEV41Volumes, out,
         [&] { return MakeV41ParamRow(knxnics); },
         [&](NetworkFileSystem& volume, MetaStruct& row) {
             if (knxnics) {
@@ -321,7 +319,7 @@ void NFS41VolumeParamSet::ExecuteInternal(const InputPtr& in, const OutputPtr& o
         in->GetParameterList(kHostKnxnic, hostKnxnics);
     }
     const std::string knxnics = JoinWithCommas(hostKnxnics);
-    SetVolumeParams(in->GetParameter(kVolumeName), NonPEV41Volumes, "NFS v4.1", out,
+    SetVolumeParams(in->GetParameter(kOptionVolumeName), NonPEV41Volumes, "NFS v4.1", out,
                     [&](NetworkFileSystem& volume) {
                         ApplyMaxQueueDepth(in, volume);
                         if (!hostKnxnics.empty()) {

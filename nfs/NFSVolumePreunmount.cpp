@@ -6,14 +6,12 @@ namespace OrvaneCli::FileSystem {
 
 namespace {
 
-constexpr const char* kVolumeName = "volume-name";
-
 using PreunmountOperation = void (StorageInfoImpl::*)(const std::string&);
 
 std::shared_ptr<InputSpec> PreunmountInputSpec(const char* volumeNameDescription)
 {
     auto inputs = InputSpec::New();
-    AddParameter(inputs, {kVolumeName, "v", ParameterType::String, volumeNameDescription, true});
+    AddParameter(inputs, {kOptionVolumeName, "v", ParameterType::String, volumeNameDescription, true});
     return inputs;
 }
 
@@ -23,7 +21,7 @@ void ChangePreunmountState(const InputPtr& in, const OutputPtr& out, PreunmountO
                            const char* failurePrefix)
 {
     StorageInfoImpl storage;
-    const std::string& volumeName = in->GetParameter(kVolumeName);
+    const std::string& volumeName = in->GetParameter(kOptionVolumeName);
     try {
         (storage.*operation)(volumeName);
         out->SetRootObject(MetaBool::New(true));

@@ -8,12 +8,10 @@ namespace OrvaneCli::FileSystem {
 
 namespace {
 
-constexpr const char* kVolumeName = "volume-name";
-
 std::shared_ptr<InputSpec> RemoveInputSpec(const char* volumeNameDescription)
 {
     auto inputs = InputSpec::New();
-    AddParameter(inputs, {kVolumeName, "v", ParameterType::String, volumeNameDescription, true});
+    AddParameter(inputs, {kOptionVolumeName, "v", ParameterType::String, volumeNameDescription, true});
     return inputs;
 }
 
@@ -21,7 +19,7 @@ std::shared_ptr<InputSpec> RemoveInputSpec(const char* volumeNameDescription)
 // before, and again when the removal failed (after the failure's message).
 void RemoveVolume(const InputPtr& in, const OutputPtr& out, HostCtl::Storage::NfsVersion version)
 {
-    const std::string volumeName = in->GetParameter(kVolumeName);
+    const std::string volumeName = in->GetParameter(kOptionVolumeName);
     const bool removed = WithStorageInfo(StorageInfoPlacement::OutsideGuard, out, [&](StorageInfoImpl&) {
         NotifyDatastore("PreUnmount", volumeName);
         // The version-checked removal is a class operation; it needs no storage object.

@@ -12,7 +12,6 @@ namespace OrvaneCli::FileSystem {
 // Parameter names both add commands use.
 namespace NfsAddArg {
 inline constexpr const char* kShare = "share";
-inline constexpr const char* kVolumeName = "volume-name";
 inline constexpr const char* kReadOnly = "readonly";
 inline constexpr const char* kIsPE = "ispe";
 inline constexpr const char* kHostKnxnic = "host-knxnic";
