@@ -49,7 +49,22 @@ std::string ChooseVolume(const std::string& label, const std::string& uuid, cons
     return label;
 }
 
-std::string VolumePath(const std::string& identifier) { return StrCat("/hlfs/volumes/", identifier); }
+// Runs `body(volume, identifier)` in the guarded region on the volume the user chose, opened
+// through its path under /hlfs/volumes/; nothing runs when the choice is refused.
+template <typename Body>
+void WithChosenVolume(const InputPtr& in, const OutputPtr& out, Body&& body)
+{
+    const std::string label = in->GetParameter(kOptionVolumeLabel);
+    const std::string uuid = in->GetParameter(kOptionVolumeUuid);
+    Guarded(out, [&] {
+        const std::string identifier = ChooseVolume(label, uuid, out);
+        if (identifier.empty()) {
+            return;
+        }
+        HlFileSystemImpl volume(StrCat("/hlfs/volumes/", identifier));
+        body(volume, identifier);
+    });
+}
 
 } // namespace
 
@@ -71,15 +86,8 @@ std::shared_ptr<OutputSpec> HLFSVolumeUpgrade::GetOutputSpecInternal() { return 
 
 void HLFSVolumeUpgrade::ExecuteInternal(const InputPtr& in, const OutputPtr& out)
 {
-    const std::string label = in->GetParameter(kOptionVolumeLabel);
-    const std::string uuid = in->GetParameter(kOptionVolumeUuid);
-    Guarded(out, [&] {
-        const std::string identifier = ChooseVolume(label, uuid, out);
-        if (identifier.empty()) {
-            return;
-        }
+    WithChosenVolume(in, out, [&](HlFileSystemImpl& volume, const std::string&) {
         // What can be converted is the host's decision; it refuses with its own message.
-        HlFileSystemImpl volume(VolumePath(identifier));
         volume.ConvertToVersion5();
         out->SetRootObject(MetaBool::New(true));
     });
@@ -104,14 +112,7 @@ std::shared_ptr<OutputSpec> HLFSVolumeUnmap::GetOutputSpecInternal() { return Bo
 
 void HLFSVolumeUnmap::ExecuteInternal(const InputPtr& in, const OutputPtr& out)
 {
-    const std::string label = in->GetParameter(kOptionVolumeLabel);
-    const std::string uuid = in->GetParameter(kOptionVolumeUuid);
-    Guarded(out, [&] {
-        const std::string identifier = ChooseVolume(label, uuid, out);
-        if (identifier.empty()) {
-            return;
-        }
-        HlFileSystemImpl volume(VolumePath(identifier));
+    WithChosenVolume(in, out, [&](HlFileSystemImpl& volume, const std::string& identifier) {
         if (!volume.IsMounted()) {
             out->AddErrorMessage(StrCat("Volume(", identifier, ") is unmounted"));
             return;
