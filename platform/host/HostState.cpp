@@ -859,8 +859,8 @@ State BuildDemo()
                                 193273528320);
         auto& h = DemoHlfs(r, "5f8d2a30-1b7c3d44-e2c1-001e67c4d2a8", 1, 6, 16);
         h.extents.push_back({"naa.600508b1001c7e4d2f9a8b3c6d5e4f10", 3});
-        h.users.push_back(DemoUser("5f8d2a35-0a4c8e21-77d3-001e67c4d2a8", "00:1e:67:c4:d2:a8", 6, 82, 3145728, 1));
-        h.users.push_back(DemoUser("5f8d2b11-4e9a0c37-1b62-001e67c4d310", "00:1e:67:c4:d3:10", 6, 82, 3149824, 1));
+        h.users.push_back(DemoUser("5f8d2a35-0a4c8e21-77d3-001e67c4d2a8", "00:1e:67:c4:d2:a8", 6, 82, 3145728, 4));
+        h.users.push_back(DemoUser("5f8d2b11-4e9a0c37-1b62-001e67c4d310", "00:1e:67:c4:d3:10", 6, 82, 3149824, 4));
         r.Mark(FsKey::users);
         fileSystems.push_back(std::move(r));
     }

@@ -135,9 +135,9 @@ const char* const kDemoHostText = R"({
       "extents": [{"deviceName": "naa.600508b1001c7e4d2f9a8b3c6d5e4f10", "partition": 3}],
       "users": [
         {"heartbeatUuid": "5f8d2a35-0a4c8e21-77d3-001e67c4d2a8", "macAddress": "00:1e:67:c4:d2:a8",
-         "driverVersionMajor": 6, "driverVersionMinor": 82, "heartbeatOffset": 3145728, "lockModeInUse": 1},
+         "driverVersionMajor": 6, "driverVersionMinor": 82, "heartbeatOffset": 3145728, "lockModeInUse": 4},
         {"heartbeatUuid": "5f8d2b11-4e9a0c37-1b62-001e67c4d310", "macAddress": "00:1e:67:c4:d3:10",
-         "driverVersionMajor": 6, "driverVersionMinor": 82, "heartbeatOffset": 3149824, "lockModeInUse": 1}
+         "driverVersionMajor": 6, "driverVersionMinor": 82, "heartbeatOffset": 3149824, "lockModeInUse": 4}
       ]
     },
     {
