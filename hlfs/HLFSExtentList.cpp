@@ -55,10 +55,10 @@ void HLFSExtentList::ExecuteInternal(const InputPtr& in, const OutputPtr& out)
     WithStorageInfo(StorageInfoPlacement::InsideGuard, out, [&](StorageInfoImpl& storage) {
         auto list = MetaList::New(MetaType::Struct, GetOutputStructure());
         auto volumes = storage.GetHlfsFileSystemsList(HostCtl::emptyString);
-        // The list is the result even when single volumes fail to be read; it is set before
-        // the walk so that the rows gathered so far survive a failure that ends it.
-        out->SetRootObject(list);
         UpdateExtentList(volumes, list, out, ignoreErrors);
+        // The list is the result even when single volumes failed to be read. A failure that
+        // ends the walk itself (the mount point unreadable for the message) leaves no list.
+        out->SetRootObject(list);
     });
 }
 
