@@ -61,7 +61,9 @@ void VolumeList::ExecuteInternal(const InputPtr& in, const OutputPtr& out)
     WithStorageInfo(StorageInfoPlacement::InsideGuard, out, [&](StorageInfoImpl& storage) {
         auto list = MetaList::New(MetaType::Struct, GetOutputStructure());
         std::vector<std::unique_ptr<HostCtl::Storage::FileSystem>> fileSystems;
-        if (in->HasParameter(kUuidParameter) && IsGiven(in->GetParameter(kUuidParameter))) {
+        // A UUID given on the command line is looked up even when empty: asking for one
+        // volume never widens to all of them.
+        if (in->HasParameter(kUuidParameter)) {
             auto fileSystem = storage.GetFileSystemByUuidEx(in->GetParameter(kUuidParameter));
             if (!fileSystem) {
                 out->AddErrorMessage("Could not find any filesystem with specified UUID.");
