@@ -14,6 +14,8 @@
 #include <variant>
 #include <vector>
 
+#include "hostctl/Storage.h"
+
 namespace HostSim::Model {
 
 // A state text that cannot be used; the message names the file and the place.
@@ -158,14 +160,8 @@ struct Heap {
     std::uint64_t maxSize = 0;
 };
 
-struct PointerBlockCacheRecord {
-    std::uint64_t cacheSize = 0;
-    std::uint64_t cacheSizeMax = 0;
-    std::uint64_t workingSet = 0;
-    std::uint64_t workingSetMax = 0;
-    std::uint64_t heapOverhead = 0;
-    std::int32_t capacityMissRatio = 0;
-};
+// Kept in the state exactly as the cache hands it out.
+using PointerBlockCacheRecord = HostCtl::Storage::PointerBlockCacheStats;
 
 struct Fault {
     std::string call;
