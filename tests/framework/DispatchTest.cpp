@@ -1,3 +1,5 @@
+#include <ostream>
+
 #include <gtest/gtest.h>
 
 #include <stdexcept>
@@ -23,6 +25,9 @@ struct DispatchCase {
     const char* out;
     const char* err;
 };
+
+// Test listings name a case by its name rather than by its bytes.
+void PrintTo(const DispatchCase& c, std::ostream* os) { *os << c.name; }
 
 class Dispatching : public ::testing::TestWithParam<DispatchCase> {};
 

@@ -1,3 +1,5 @@
+#include <ostream>
+
 #include <gtest/gtest.h>
 
 #include "FakeCommand.h"
@@ -101,6 +103,9 @@ struct UsageCase {
     bool whole;
     const char* expected;
 };
+
+// Test listings name a case by its name rather than by its bytes.
+void PrintTo(const UsageCase& c, std::ostream* os) { *os << c.name; }
 
 class UsageErrors : public ::testing::TestWithParam<UsageCase> {};
 

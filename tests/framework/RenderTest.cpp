@@ -1,3 +1,5 @@
+#include <ostream>
+
 #include <gtest/gtest.h>
 
 #include <nlohmann/json.hpp>
@@ -33,6 +35,9 @@ struct RenderCase {
     bool showHeader;
     const char* expected;
 };
+
+// Test listings name a case by its name rather than by its bytes.
+void PrintTo(const RenderCase& c, std::ostream* os) { *os << c.name; }
 
 class ListRendering : public ::testing::TestWithParam<RenderCase> {};
 

@@ -6,6 +6,8 @@
 #include <stdexcept>
 #include <tuple>
 
+#include <ostream>
+
 #include <gtest/gtest.h>
 #include <sys/file.h>
 #include <fcntl.h>
@@ -54,6 +56,9 @@ struct BadState {
     const char* text;
     const char* place; // must appear in the message after the file name
 };
+
+// Test listings name a case by its name rather than by its bytes.
+void PrintTo(const BadState& c, std::ostream* os) { *os << c.name; }
 
 const BadState kBadStates[] = {
     {"syntax", R"({"fileSystems": [})", "line 1, column 18"},
