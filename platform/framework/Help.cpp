@@ -131,20 +131,16 @@ std::string NamespaceHelp(const CommandPath& path, const NamespaceNode& node)
     if (!node.GetDescription().empty()) {
         out += "\n" + node.GetDescription() + "\n";
     }
-    std::vector<std::pair<std::string, std::string>> namespaces;
-    std::vector<std::pair<std::string, std::string>> commands;
+    // One list in registration order; a namespace is marked by the "..." that goes on after it.
+    std::vector<std::pair<std::string, std::string>> children;
     for (const auto& [name, child] : node.GetChildren()) {
         const bool isCommand = std::dynamic_pointer_cast<Command>(child) != nullptr;
-        (isCommand ? commands : namespaces).emplace_back(name, child ? child->GetDescription() : std::string());
+        children.emplace_back(isCommand ? name : name + " ...", child ? child->GetDescription() : std::string());
     }
-    if (!namespaces.empty()) {
-        out += "\nAvailable namespaces:\n" + TwoColumns(namespaces, "  ");
-    }
-    if (!commands.empty()) {
-        out += "\nAvailable commands:\n" + TwoColumns(commands, "  ");
-    }
-    if (namespaces.empty() && commands.empty()) {
+    if (children.empty()) {
         out += "\nThis namespace has no commands.\n";
+    } else {
+        out += "\nAvailable commands and namespaces:\n" + TwoColumns(children, "  ");
     }
     if (path.empty()) {
         out += "\n" + GlobalOptionsHelp();

@@ -214,12 +214,12 @@ TEST(Help, NamespaceHelpListsChildrenInRegistrationOrder)
     ns->SetDescription("Things.");
     auto zeta = Namespace::New();
     zeta->SetDescription("Last letter.");
-    ns->RegisterNamespaceNode(zeta, "zeta");
     ns->RegisterNamespaceNode(FakeCommand::New("Run b."), "b");
+    ns->RegisterNamespaceNode(zeta, "zeta");
     ns->RegisterNamespaceNode(FakeCommand::New("Run a."), "a");
     EXPECT_EQ(NamespaceHelp({"x"}, *ns),
               "Usage: autocli [GLOBAL OPTIONS] x {NAMESPACE|COMMAND} ... [PARAMETERS]\n\nThings.\n\n"
-              "Available namespaces:\n  zeta  Last letter.\n\nAvailable commands:\n  b  Run b.\n  a  Run a.\n");
+              "Available commands and namespaces:\n  b         Run b.\n  zeta ...  Last letter.\n  a         Run a.\n");
 }
 
 } // namespace
