@@ -146,17 +146,8 @@ class PointerBlockCacheObject final : public HostCtl::Storage::PointerBlockCache
 public:
     HostCtl::Storage::PointerBlockCacheStats GetStatistics() override
     {
-        return HostCall("PointerBlockCache.GetStatistics", {}, nullptr, [](State& st) {
-            const auto& c = st.pointerBlockCache;
-            HostCtl::Storage::PointerBlockCacheStats out;
-            out.cacheSize = c.cacheSize;
-            out.cacheSizeMax = c.cacheSizeMax;
-            out.workingSet = c.workingSet;
-            out.workingSetMax = c.workingSetMax;
-            out.heapOverhead = c.heapOverhead;
-            out.capacityMissRatio = c.capacityMissRatio;
-            return out;
-        });
+        return HostCall("PointerBlockCache.GetStatistics", {}, nullptr,
+                        [](State& st) -> HostCtl::Storage::PointerBlockCacheStats { return st.pointerBlockCache; });
     }
     void ResetStatistics() override
     {
