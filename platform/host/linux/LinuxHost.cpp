@@ -93,6 +93,7 @@ struct Volume {
     NfsSource remote;
     std::optional<Capacity> capacity;
     std::string capacityError; // why capacity is missing
+    bool freshlyAdded = false; // registered by this process and not mounted since
 };
 using VolumePtr = std::shared_ptr<Volume>;
 
@@ -436,8 +437,17 @@ public:
     {
         const J args = J::array({isPE});
         On("NetworkFileSystem.SetPE", &args, [&] {
-            if (isPE)
-                NotAvailable("NetworkFileSystem.SetPE");
+            if (!isPE)
+                return;
+            // The add that made this volume fails here, before any mount: its definition must
+            // not stay behind as if the add had worked.
+            if (volume().freshlyAdded && !volume().mounted)
+                TheRegistry().Update([&](std::vector<RegisteredVolume>& volumes) {
+                    volumes.erase(std::remove_if(volumes.begin(), volumes.end(),
+                                                 [&](const RegisteredVolume& r) { return r.name == volume().volumeName; }),
+                                  volumes.end());
+                });
+            NotAvailable("NetworkFileSystem.SetPE");
         });
     }
     std::string GetKnxnic() override { return {}; }
@@ -514,16 +524,44 @@ public:
     }
 };
 
-class LinuxHardwareInfo final : public HostCtl::HardwareInfo {
+// The HLFS heaps and their pointer block cache have no counterpart on Linux.
+class LinuxMemoryInfo final : public HostCtl::MemoryInfo {
 public:
-    std::unique_ptr<HostCtl::MemoryInfo> GetMemoryInfo() override { NotAvailable("HardwareInfo.GetMemoryInfo"); }
+    std::vector<std::unique_ptr<HostCtl::HeapRecord>> GetHeapStats() override
+    {
+        NotAvailable("MemoryInfo.GetHeapStats");
+    }
 };
 
-// Linux has none of the host's advanced option groups.
+class LinuxHardwareInfo final : public HostCtl::HardwareInfo {
+public:
+    std::unique_ptr<HostCtl::MemoryInfo> GetMemoryInfo() override { return std::make_unique<LinuxMemoryInfo>(); }
+};
+
+class OnlineUpgradeOption final : public HostCtl::AdvancedIntegerOption {
+public:
+    std::string GetName() override { return "EnableOnlineATSUpgrade"; }
+    std::int64_t GetValue() override { return 0; }
+};
+
+// Of the host's advanced options only HLFS3/EnableOnlineATSUpgrade has an answer here: off,
+// as there is no HLFS volume to upgrade.
+class LinuxOptionGroup final : public HostCtl::AdvancedOptionGroup {
+public:
+    std::unique_ptr<HostCtl::AdvancedOption> GetOption(const std::string& name) override
+    {
+        if (name == "EnableOnlineATSUpgrade")
+            return std::make_unique<OnlineUpgradeOption>();
+        throw HostCtlException("Advanced option 'HLFS3/" + name + "' not found");
+    }
+};
+
 class LinuxAdvancedOptions final : public HostCtl::AdvancedOptions {
 public:
     std::unique_ptr<HostCtl::AdvancedOptionGroup> GetOptionGroup(const std::string& name) override
     {
+        if (name == "HLFS3")
+            return std::make_unique<LinuxOptionGroup>();
         throw HostCtlException("Advanced option group '" + name + "' not found");
     }
 };
@@ -681,6 +719,8 @@ std::unique_ptr<NetworkFileSystem> Register(RegisteredVolume reg)
                                  "' cannot be used on a Linux host: it must be a folder name (no '/', not '.' or '..')");
     if (reg.hosts.empty() || reg.hosts.front().empty())
         throw std::runtime_error("NFS volume '" + reg.name + "' needs a server");
+    // A volume that could never be mounted here is not recorded at all.
+    RequireNfsClient(ReadFilesystemKinds(), reg.v41);
     for (const auto& v : Look().mounted)
         if (v->volumeName == reg.name)
             throw std::runtime_error("A volume named '" + reg.name + "' already exists");
@@ -691,6 +731,7 @@ std::unique_ptr<NetworkFileSystem> Register(RegisteredVolume reg)
         volumes.push_back(reg);
     });
     auto v = FromRegistry(reg, TheRegistry());
+    v->freshlyAdded = true;
     return std::make_unique<LinuxNetworkFileSystem>(v);
 }
 
