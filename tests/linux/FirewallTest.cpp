@@ -88,7 +88,6 @@ TEST(Firewall, AddListRemoveInAPrivateNetworkNamespace)
     // Each step prints a marker, its exit code and its output; nft lists the table at the
     // points where the test compares.
     const std::string script = R"(
-step() { name=$1; shift; out=$("$@" 2>&1); echo "@@$name $?"; echo "$out"; }
 step add1 "$AUTOCLI" --host linux --formatter json storage nfs firewall add -F 10.20.40.5/24
 step add2 "$AUTOCLI" --host linux --formatter json storage nfs firewall add -F fd00::7/64
 step add3 "$AUTOCLI" --host linux --formatter json storage nfs41 firewall add -F 192.168.9.0/24
@@ -103,22 +102,11 @@ step removeagain "$AUTOCLI" --host linux storage nfs firewall remove -F 10.20.40
 step list2 "$AUTOCLI" --host linux --formatter json storage nfs firewall list
 step nft2 nft -j list table inet autocli
 )";
-    const auto ran = LinuxTest::RunInNamespaces({"-n"}, script);
+    const auto ran = LinuxTest::RunInNamespaces({"-n"}, LinuxTest::kStepFunction + script);
     ASSERT_EQ(ran.exitCode, 0) << ran.err;
-    std::map<std::string, std::pair<int, std::string>> steps;
-    std::string current;
-    std::istringstream in(ran.out);
-    for (std::string line; std::getline(in, line);) {
-        if (line.rfind("@@", 0) == 0) {
-            const auto blank = line.find(' ');
-            current = line.substr(2, blank - 2);
-            steps[current].first = std::stoi(line.substr(blank + 1));
-        } else {
-            steps[current].second += line + "\n";
-        }
-    }
-    if (steps["add1"].second.find("Operation not permitted") != std::string::npos)
-        GTEST_SKIP() << "the packet filter refuses changes here: " << steps["add1"].second;
+    auto steps = LinuxTest::ParseSteps(ran.out);
+    if (steps["add1"].output.find("Operation not permitted") != std::string::npos)
+        GTEST_SKIP() << "the packet filter refuses changes here: " << steps["add1"].output;
 
     struct Expect {
         const char* step;
@@ -137,23 +125,23 @@ step nft2 nft -j list table inet autocli
     };
     for (const auto& e : expectations) {
         SCOPED_TRACE(e.step);
-        EXPECT_EQ(steps[e.step].first, e.exitCode) << steps[e.step].second;
-        EXPECT_NE(steps[e.step].second.find(e.contains), std::string::npos) << steps[e.step].second;
+        EXPECT_EQ(steps[e.step].exitCode, e.exitCode) << steps[e.step].output;
+        EXPECT_NE(steps[e.step].output.find(e.contains), std::string::npos) << steps[e.step].output;
     }
 
     // The listing is what the packet filter holds, normalised the way it keeps entries.
-    ASSERT_EQ(steps["list1"].first, 0) << steps["list1"].second;
-    EXPECT_EQ(nlohmann::json::parse(steps["list1"].second)["Allowed IPMask"], "10.20.40.0/24,fd00::/64");
-    EXPECT_EQ(nlohmann::json::parse(steps["list41"].second)["Allowed IPMask"], "192.168.9.0/24");
-    ASSERT_EQ(steps["nft1"].first, 0) << steps["nft1"].second;
-    const auto before = nlohmann::json::parse(steps["nft1"].second);
+    ASSERT_EQ(steps["list1"].exitCode, 0) << steps["list1"].output;
+    EXPECT_EQ(nlohmann::json::parse(steps["list1"].output)["Allowed IPMask"], "10.20.40.0/24,fd00::/64");
+    EXPECT_EQ(nlohmann::json::parse(steps["list41"].output)["Allowed IPMask"], "192.168.9.0/24");
+    ASSERT_EQ(steps["nft1"].exitCode, 0) << steps["nft1"].output;
+    const auto before = nlohmann::json::parse(steps["nft1"].output);
     EXPECT_EQ(Elements(before, "nfsClient_v4"), "10.20.40.0/24");
     EXPECT_EQ(Elements(before, "nfsClient_v6"), "fd00::/64");
     EXPECT_EQ(Elements(before, "nfs41Client_v4"), "192.168.9.0/24");
 
     // After the remove, neither autocli nor nft shows the entry.
-    EXPECT_EQ(nlohmann::json::parse(steps["list2"].second)["Allowed IPMask"], "fd00::/64");
-    const auto after = nlohmann::json::parse(steps["nft2"].second);
+    EXPECT_EQ(nlohmann::json::parse(steps["list2"].output)["Allowed IPMask"], "fd00::/64");
+    const auto after = nlohmann::json::parse(steps["nft2"].output);
     EXPECT_EQ(Elements(after, "nfsClient_v4"), "");
     EXPECT_EQ(Elements(after, "nfsClient_v6"), "fd00::/64");
 }

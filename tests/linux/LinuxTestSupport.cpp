@@ -16,6 +16,8 @@
 #include <sstream>
 #include <stdexcept>
 
+#include "support/Cli.h"
+
 extern char** environ;
 
 namespace LinuxTest {
@@ -115,9 +117,8 @@ Ran Run(const std::vector<std::string>& args, const std::vector<std::string>& en
 
 Ran Autocli(const std::vector<std::string>& args, const std::vector<std::string>& env)
 {
-    std::vector<std::string> argv{AUTOCLI_BINARY};
-    argv.insert(argv.end(), args.begin(), args.end());
-    return Run(argv, env);
+    const auto ran = TestSupport::RunAutocli(args, "", env);
+    return {ran.exitCode, ran.out, ran.err};
 }
 
 Ran RunInNamespaces(const std::vector<std::string>& flags, const std::string& script,
@@ -129,6 +130,25 @@ Ran RunInNamespaces(const std::vector<std::string>& flags, const std::string& sc
     std::vector<std::string> fullEnv{std::string("AUTOCLI=") + AUTOCLI_BINARY};
     fullEnv.insert(fullEnv.end(), env.begin(), env.end());
     return Run(argv, fullEnv);
+}
+
+const char* const kStepFunction = "step() { name=$1; shift; out=$(\"$@\" 2>&1); echo \"@@$name $?\"; echo \"$out\"; }\n";
+
+std::map<std::string, Step> ParseSteps(const std::string& out)
+{
+    std::map<std::string, Step> steps;
+    std::string current;
+    std::istringstream in(out);
+    for (std::string line; std::getline(in, line);) {
+        if (line.rfind("@@", 0) == 0) {
+            const auto blank = line.find(' ');
+            current = line.substr(2, blank - 2);
+            steps[current].exitCode = std::stoi(line.substr(blank + 1));
+        } else {
+            steps[current].output += line + "\n";
+        }
+    }
+    return steps;
 }
 
 std::optional<std::string> NamespaceProblem(const std::vector<std::string>& flags)

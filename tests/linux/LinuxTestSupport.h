@@ -4,6 +4,7 @@
 // namespaces so that nothing a test does reaches the machine's own mounts or packet filter.
 
 #include <functional>
+#include <map>
 #include <optional>
 #include <string>
 #include <vector>
@@ -27,6 +28,17 @@ Ran Autocli(const std::vector<std::string>& args, const std::vector<std::string>
 // {"-n"} or {"-m", "--propagation", "private"}). The script finds autocli in $AUTOCLI.
 Ran RunInNamespaces(const std::vector<std::string>& flags, const std::string& script,
                     const std::vector<std::string>& env = {});
+
+// Scripts run their commands through this shell function: `step NAME command...` prints
+// "@@NAME EXIT" and then the command's output (standard output and error together).
+extern const char* const kStepFunction;
+
+struct Step {
+    int exitCode = -1;
+    std::string output;
+};
+// The steps a script printed, by name.
+std::map<std::string, Step> ParseSteps(const std::string& out);
 
 // Why namespaces of that kind cannot be made here, or nothing when they can.
 std::optional<std::string> NamespaceProblem(const std::vector<std::string>& flags);

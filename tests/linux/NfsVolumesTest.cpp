@@ -69,7 +69,6 @@ TEST(NfsVolumes, ServedFromANamespaceWithAStandIn)
         {"name": "vol41", "version": "4.1", "hosts": ["a.example", "b.example"], "share": "/export/two",
          "readOnly": true, "connections": 1, "security": 2, "explicitlyUnmounted": true}]})");
     const std::string script = R"SH(
-step() { name=$1; shift; out=$("$@" 2>&1); echo "@@$name $?"; echo "$out"; }
 mkdir -p "$DIR/volumes/vol1" "$DIR/volumes/vol2" || exit 9
 mount -t tmpfs standin "$DIR/volumes/vol1" || exit 10
 step nfslist "$AUTOCLI" --host linux --formatter json storage nfs list
@@ -94,21 +93,10 @@ exec 3<&-
 step remove41 "$AUTOCLI" --host linux --formatter json storage nfs41 remove -v vol41
 step registry2 cat "$DIR/linux-host.json"
 )SH";
-    const auto ran = LinuxTest::RunInNamespaces({"-m", "--propagation", "private"}, script,
+    const auto ran = LinuxTest::RunInNamespaces({"-m", "--propagation", "private"}, LinuxTest::kStepFunction + script,
                                                 {"DIR=" + state, "AUTOCLI_LINUX_DIR=" + state});
     ASSERT_EQ(ran.exitCode, 0) << ran.out << ran.err;
-    std::map<std::string, std::pair<int, std::string>> steps;
-    std::string current;
-    std::istringstream in(ran.out);
-    for (std::string line; std::getline(in, line);) {
-        if (line.rfind("@@", 0) == 0) {
-            const auto blank = line.find(' ');
-            current = line.substr(2, blank - 2);
-            steps[current].first = std::stoi(line.substr(blank + 1));
-        } else {
-            steps[current].second += line + "\n";
-        }
-    }
+    auto steps = LinuxTest::ParseSteps(ran.out);
 
     struct Expect {
         const char* step;
@@ -130,12 +118,12 @@ step registry2 cat "$DIR/linux-host.json"
     };
     for (const auto& e : expectations) {
         SCOPED_TRACE(e.step);
-        EXPECT_EQ(steps[e.step].first, e.exitCode) << steps[e.step].second;
-        EXPECT_NE(steps[e.step].second.find(e.contains), std::string::npos) << steps[e.step].second;
+        EXPECT_EQ(steps[e.step].exitCode, e.exitCode) << steps[e.step].output;
+        EXPECT_NE(steps[e.step].output.find(e.contains), std::string::npos) << steps[e.step].output;
     }
 
     // Lists: the mounted volume from the mount table, the other from the registry.
-    const auto v3 = nlohmann::json::parse(steps["nfslist"].second);
+    const auto v3 = nlohmann::json::parse(steps["nfslist"].output);
     ASSERT_EQ(v3.size(), 1u) << v3.dump();
     EXPECT_EQ(v3[0]["Volume Name"], "vol1");
     EXPECT_EQ(v3[0]["Host"], "nfs.example");
@@ -144,7 +132,7 @@ step registry2 cat "$DIR/linux-host.json"
     EXPECT_EQ(v3[0]["Accessible"], true);
     EXPECT_EQ(v3[0]["Connections"], 2);
     EXPECT_EQ(v3[0]["isPE"], false);
-    const auto v41 = nlohmann::json::parse(steps["nfs41list"].second);
+    const auto v41 = nlohmann::json::parse(steps["nfs41list"].output);
     ASSERT_EQ(v41.size(), 1u) << v41.dump();
     EXPECT_EQ(v41[0]["Volume Name"], "vol41");
     EXPECT_EQ(v41[0]["Host(s)"], "a.example,b.example");
@@ -152,18 +140,18 @@ step registry2 cat "$DIR/linux-host.json"
     EXPECT_EQ(v41[0]["Accessible"], false);
     EXPECT_EQ(v41[0]["Read-Only"], true);
     EXPECT_EQ(v41[0]["Security"], "krb5");
-    EXPECT_EQ(steps["param"].first, 0) << steps["param"].second;
+    EXPECT_EQ(steps["param"].exitCode, 0) << steps["param"].output;
     // A tmpfs is no block file system: the file system list leaves it out.
-    EXPECT_EQ(steps["fslist"].second.find("vol1"), std::string::npos) << steps["fslist"].second;
+    EXPECT_EQ(steps["fslist"].output.find("vol1"), std::string::npos) << steps["fslist"].output;
 
     // The unmount is remembered (automount leaves the volume alone), then it is removed.
-    const auto afterUnmount = nlohmann::json::parse(steps["registry1"].second);
+    const auto afterUnmount = nlohmann::json::parse(steps["registry1"].output);
     EXPECT_EQ(afterUnmount["volumes"][0]["name"], "vol1");
     EXPECT_EQ(afterUnmount["volumes"][0]["explicitlyUnmounted"], true);
-    const auto after = nlohmann::json::parse(steps["after"].second);
+    const auto after = nlohmann::json::parse(steps["after"].output);
     ASSERT_EQ(after.size(), 1u);
     EXPECT_EQ(after[0]["Mounted"], false);
-    EXPECT_EQ(nlohmann::json::parse(steps["registry2"].second)["volumes"], nlohmann::json::array());
+    EXPECT_EQ(nlohmann::json::parse(steps["registry2"].output)["volumes"], nlohmann::json::array());
     struct stat st{};
     EXPECT_NE(::stat((state + "/volumes/vol1").c_str(), &st), 0) << "the empty mount point stays behind";
 }
