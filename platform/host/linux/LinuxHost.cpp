@@ -6,6 +6,7 @@
 #include <algorithm>
 #include <climits>
 #include <cstdlib>
+#include <functional>
 #include <optional>
 #include <stdexcept>
 #include <type_traits>
@@ -459,7 +460,7 @@ public:
     }
     std::int64_t GetConnections() override
     {
-        if (volume().mounted && volume().kind != MountKind::Other && !volume().source.empty())
+        if (MountedNfs())
             return volume().options.connections;
         return volume().registered ? volume().registered->connections : 1;
     }
