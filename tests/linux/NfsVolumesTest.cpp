@@ -52,6 +52,24 @@ TEST(NfsVolumes, AddOnAKernelWithoutNfsClientSaysSoAndRecordsNothing)
     const auto listed = LinuxTest::Autocli({"--host", "linux", "--formatter", "json", "storage", "nfs", "list"}, env);
     EXPECT_EQ(listed.exitCode, 0) << listed.err;
     EXPECT_EQ(nlohmann::json::parse(listed.out), nlohmann::json::array());
+
+    // A volume recorded where the kernel could mount it (the registry moved with a disk, say):
+    // mounting it, by hand or automatically, gives the same clear answer and changes nothing.
+    ASSERT_EQ(::mkdir((dir.Path() + "/state").c_str(), 0755), 0);
+    const std::string registry = R"({"volumes": [{"name": "moved", "version": "3", "hosts": ["10.0.0.1"],
+        "share": "/export", "readOnly": false, "connections": 1, "security": 0, "explicitlyUnmounted": false}]})";
+    LinuxTest::WriteFile(dir.Path() + "/state/linux-host.json", registry);
+    for (const auto& args : {std::vector<std::string>{"storage", "filesystem", "mount", "-l", "moved"},
+                             std::vector<std::string>{"storage", "filesystem", "automount"}}) {
+        SCOPED_TRACE(args[2]);
+        std::vector<std::string> full{"--host", "linux"};
+        full.insert(full.end(), args.begin(), args.end());
+        const auto ran = LinuxTest::Autocli(full, env);
+        EXPECT_EQ(ran.exitCode, 1) << ran.out << ran.err;
+        EXPECT_NE(ran.err.find(kNoClient), std::string::npos) << ran.err;
+    }
+    EXPECT_EQ(LinuxTest::ReadFile(dir.Path() + "/state/linux-host.json"), registry);
+    EXPECT_NE(::stat((dir.Path() + "/state/volumes").c_str(), &st), 0);
 }
 
 TEST(NfsVolumes, ServedFromANamespaceWithAStandIn)
@@ -94,7 +112,8 @@ step remove41 "$AUTOCLI" --host linux --formatter json storage nfs41 remove -v v
 step registry2 cat "$DIR/linux-host.json"
 )SH";
     const auto ran = LinuxTest::RunInNamespaces({"-m", "--propagation", "private"}, LinuxTest::kStepFunction + script,
-                                                {"DIR=" + state, "AUTOCLI_LINUX_DIR=" + state});
+                                                {"DIR=" + state, "AUTOCLI_LINUX_DIR=" + state,
+                                                 "AUTOCLI_JOURNAL=" + dir.Path() + "/journal"});
     ASSERT_EQ(ran.exitCode, 0) << ran.out << ran.err;
     auto steps = LinuxTest::ParseSteps(ran.out);
 
@@ -154,6 +173,13 @@ step registry2 cat "$DIR/linux-host.json"
     EXPECT_EQ(nlohmann::json::parse(steps["registry2"].output)["volumes"], nlohmann::json::array());
     struct stat st{};
     EXPECT_NE(::stat((state + "/volumes/vol1").c_str(), &st), 0) << "the empty mount point stays behind";
+
+    // The journal holds the changes the Linux host was asked for, with their outcome.
+    const std::string journal = LinuxTest::ReadFile(dir.Path() + "/journal");
+    for (const char* line : {R"({"call":"FileSystem.Unmount","target":"vol1","args":[0]})",
+                             R"({"call":"StorageInfoImpl.RemoveNetworkFileSystem","target":"vol1","args":["vol1",1]})",
+                             R"({"call":"StorageInfoImpl.RemoveNetworkFileSystem","target":"vol41","args":["vol41",2],"error":"Volume 'vol41' is busy"})"})
+        EXPECT_NE(journal.find(line), std::string::npos) << line << "\n" << journal;
 }
 
 TEST(NfsVolumes, NfsGaneshaServerOnLoopback)
