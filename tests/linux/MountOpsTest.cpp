@@ -100,27 +100,4 @@ TEST(MountOps, LinksInTheWayAreRefused)
     EXPECT_NE(::stat((elsewhere + "/vol").c_str(), &st), 0);
 }
 
-TEST(MountOps, NoNfsClientIsNamedPlainly)
-{
-    FilesystemKinds none;
-    none.block = {"ext4"};
-    try {
-        RequireNfsClient(none, false);
-        FAIL() << "no error";
-    } catch (const std::runtime_error& e) {
-        EXPECT_STREQ(e.what(), "This kernel has no NFS client (nfs is not in /proc/filesystems)");
-    }
-    FilesystemKinds v3Only;
-    v3Only.nodev = {"nfs"};
-    EXPECT_NO_THROW(RequireNfsClient(v3Only, false));
-    EXPECT_THROW(RequireNfsClient(v3Only, true), std::runtime_error);
-}
-
-TEST(MountOps, ResolvesAddressesWithoutTheNetwork)
-{
-    EXPECT_EQ(ResolveHost("127.0.0.1"), "127.0.0.1");
-    EXPECT_EQ(ResolveHost("::1"), "::1");
-    EXPECT_EQ(ResolveHost("FD00:0::1"), "fd00::1");
-}
-
 } // namespace

@@ -149,12 +149,6 @@ TEST(MountTable, NfsOptionEdges)
     }
 }
 
-TEST(MountTable, FsidIsSixteenHexDigits)
-{
-    EXPECT_EQ(FsidText(0x9b601a0a7c6afc77ULL), "9b601a0a7c6afc77");
-    EXPECT_EQ(FsidText(0x1fULL), "000000000000001f");
-}
-
 TEST(MountTable, StatWithinAnswersAndFails)
 {
     const auto root = StatWithin("/", 5);
