@@ -56,13 +56,6 @@ TEST(HostChoice, UsageErrorsAndChoices)
     }
 }
 
-TEST(HostChoice, HelpNamesTheOption)
-{
-    const auto ran = LinuxTest::Autocli({"--help"});
-    EXPECT_EQ(ran.exitCode, 0);
-    EXPECT_NE(ran.out.find("--host sim|linux"), std::string::npos) << ran.out;
-}
-
 struct AnswerCase {
     const char* name;
     std::vector<std::string> args;
