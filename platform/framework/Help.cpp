@@ -66,6 +66,7 @@ std::string GlobalOptionsHelp()
 {
     return "Global options:\n" +
            TwoColumns({{"--state FILE", "Host state file (default: $AUTOCLI_STATE, else the user's state folder)."},
+                       {"--host sim|linux", "The simulated host, or this machine (default: $AUTOCLI_HOST, else sim)."},
                        {"--formatter NAME", "Output format: table, simple, json or csv."},
                        {"--format-param KEY=VALUE", "fields=A,B,C chooses the fields; show-header=false drops the header."},
                        {"-h, --help", "Help for the path given so far."},

@@ -122,7 +122,7 @@ std::string ApplyFormatParam(const std::string& text, GlobalOptions& globals, st
 }
 
 // The options every command line may carry. Those that choose the session or end the run
-// early (--state, --version, --dump-state) are taken only before the path.
+// early (--state, --host, --version, --dump-state) are taken only before the path.
 class GlobalReader {
 public:
     explicit GlobalReader(GlobalOptions& globals) : globals_(globals) {}
@@ -138,7 +138,7 @@ public:
             globals_.help = true;
             return Match::Taken;
         }
-        const bool early = name == "--state" || name == "--version" || name == "--dump-state";
+        const bool early = name == "--state" || name == "--host" || name == "--version" || name == "--dump-state";
         if (early && !leading) {
             error = "Option '" + name + "' must come before the command path.";
             return Match::Failed;
@@ -151,7 +151,7 @@ public:
             (name == "--version" ? globals_.version : globals_.dumpState) = true;
             return Match::Taken;
         }
-        if (name != "--state" && name != "--formatter" && name != "--format-param") {
+        if (name != "--state" && name != "--host" && name != "--formatter" && name != "--format-param") {
             return Match::NotMine;
         }
         std::string value;
@@ -169,6 +169,18 @@ public:
                 return Match::Failed;
             }
             globals_.statePath = value;
+            return Match::Taken;
+        }
+        if (name == "--host") {
+            if (globals_.hostName) {
+                error = "Option '--host' given more than once.";
+                return Match::Failed;
+            }
+            if (value != "sim" && value != "linux") {
+                error = "Unknown host " + Quote(value) + ": use sim or linux.";
+                return Match::Failed;
+            }
+            globals_.hostName = value;
             return Match::Taken;
         }
         if (name == "--formatter") {

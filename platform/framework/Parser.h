@@ -18,6 +18,7 @@ namespace Quillets::Cli {
 
 struct GlobalOptions {
     std::optional<std::string> statePath;
+    std::optional<std::string> hostName; // --host: "sim" or "linux"
     OutputOptions output;
     bool help = false;
     bool version = false;

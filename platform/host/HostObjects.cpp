@@ -1,4 +1,5 @@
 #include "HostObjects.h"
+#include "linux/LinuxHost.h"
 
 #include <algorithm>
 #include <array>
@@ -517,6 +518,8 @@ const FileSystemRecord* HlfsAt(std::string_view path)
 
 HlFileSystemImpl::HlFileSystemImpl(const std::string& path)
 {
+    if (HostLinux::Active())
+        HostLinux::OpenHlfs(path);
     Runtime::JournalEntry entry{"", J::array({path})};
     handle_ = Runtime::Run("HlFileSystemImpl.new", &entry, [&] {
         Runtime::CheckedState();
@@ -537,6 +540,8 @@ HlFileSystemImpl::~HlFileSystemImpl() = default;
 
 std::unique_ptr<HlFileSystem> HlFileSystemImpl::GetHLFSFileSystemByLabel(const std::string& label)
 {
+    if (HostLinux::Active())
+        return nullptr;
     return Runtime::Run("HlFileSystemImpl.GetHLFSFileSystemByLabel", nullptr, [&]() -> std::unique_ptr<HlFileSystem> {
         Runtime::CheckedState();
         Runtime::CheckFault("HlFileSystemImpl.GetHLFSFileSystemByLabel", {label});
@@ -547,6 +552,8 @@ std::unique_ptr<HlFileSystem> HlFileSystemImpl::GetHLFSFileSystemByLabel(const s
 
 std::unique_ptr<HlFileSystem> HlFileSystemImpl::GetHLFSFileSystemByUUID(const std::string& uuid)
 {
+    if (HostLinux::Active())
+        return nullptr;
     return Runtime::Run("HlFileSystemImpl.GetHLFSFileSystemByUUID", nullptr, [&]() -> std::unique_ptr<HlFileSystem> {
         Runtime::CheckedState();
         Runtime::CheckFault("HlFileSystemImpl.GetHLFSFileSystemByUUID", {uuid});

@@ -5,6 +5,7 @@
 #include "HostObjects.h"
 #include "hostctl/Host.h"
 #include "hostctl/StorageInfoImpl.h"
+#include "linux/LinuxHost.h"
 
 namespace {
 
@@ -309,6 +310,8 @@ namespace HostCtl {
 
 Host* HostFactory::GetHost()
 {
+    if (HostLinux::Active())
+        return HostLinux::GetHost();
     static HostObject host;
     return &host;
 }
@@ -319,6 +322,8 @@ namespace KnxCtl::Storage {
 
 StorageInfoImpl::StorageInfoImpl()
 {
+    if (HostLinux::Active())
+        return;
     HostCall("StorageInfoImpl.new", {}, nullptr, [](State&) {});
 }
 
@@ -334,6 +339,8 @@ bool StorageInfoImpl::IsNotHidden(NetworkFileSystem& fs)
 
 std::vector<std::unique_ptr<FileSystem>> StorageInfoImpl::GetFileSystems()
 {
+    if (HostLinux::Active())
+        return HostLinux::Storage::GetFileSystems();
     return HostCall("StorageInfoImpl.GetFileSystems", {}, nullptr, [](State& st) {
         std::vector<std::unique_ptr<FileSystem>> result;
         result.reserve(st.fileSystems.size());
@@ -345,6 +352,8 @@ std::vector<std::unique_ptr<FileSystem>> StorageInfoImpl::GetFileSystems()
 
 std::unique_ptr<FileSystem> StorageInfoImpl::GetFileSystemByUuidEx(const std::string& uuid)
 {
+    if (HostLinux::Active())
+        return HostLinux::Storage::GetFileSystemByUuid("StorageInfoImpl.GetFileSystemByUuidEx", uuid);
     return HostCall("StorageInfoImpl.GetFileSystemByUuidEx", {uuid}, nullptr, [&](State&) -> std::unique_ptr<FileSystem> {
         const FileSystemRecord* fs = Runtime::FirstByUuid(uuid);
         return fs ? Objects::MakeFileSystem(*fs) : nullptr;
@@ -353,6 +362,8 @@ std::unique_ptr<FileSystem> StorageInfoImpl::GetFileSystemByUuidEx(const std::st
 
 std::unique_ptr<FileSystem> StorageInfoImpl::GetFileSystemByUUID(const std::string& uuid)
 {
+    if (HostLinux::Active())
+        return HostLinux::Storage::GetFileSystemByUuid("StorageInfoImpl.GetFileSystemByUUID", uuid);
     return HostCall("StorageInfoImpl.GetFileSystemByUUID", {uuid}, nullptr, [&](State&) -> std::unique_ptr<FileSystem> {
         const FileSystemRecord* fs = Runtime::FirstByUuid(uuid);
         return fs ? Objects::MakeFileSystem(*fs) : nullptr;
@@ -361,6 +372,8 @@ std::unique_ptr<FileSystem> StorageInfoImpl::GetFileSystemByUUID(const std::stri
 
 std::unique_ptr<FileSystem> StorageInfoImpl::GetFileSystemByLabel(const std::string& label)
 {
+    if (HostLinux::Active())
+        return HostLinux::Storage::GetFileSystemByLabel(label);
     return HostCall("StorageInfoImpl.GetFileSystemByLabel", {label}, nullptr, [&](State&) -> std::unique_ptr<FileSystem> {
         const FileSystemRecord* fs = Runtime::FirstByVolumeName(label);
         return fs ? Objects::MakeFileSystem(*fs) : nullptr;
@@ -369,6 +382,8 @@ std::unique_ptr<FileSystem> StorageInfoImpl::GetFileSystemByLabel(const std::str
 
 std::unique_ptr<FileSystem> StorageInfoImpl::GetFileSystemByPath(const std::string& path)
 {
+    if (HostLinux::Active())
+        return HostLinux::Storage::GetFileSystemByPath(path);
     return HostCall("StorageInfoImpl.GetFileSystemByPath", {path}, nullptr, [&](State&) -> std::unique_ptr<FileSystem> {
         const FileSystemRecord* fs = Runtime::FirstMountedByPath(path);
         return fs ? Objects::MakeFileSystem(*fs) : nullptr;
@@ -377,18 +392,24 @@ std::unique_ptr<FileSystem> StorageInfoImpl::GetFileSystemByPath(const std::stri
 
 std::vector<std::unique_ptr<HlFileSystem>> StorageInfoImpl::GetHlfsFileSystems(const std::string& filter)
 {
+    if (HostLinux::Active())
+        return {};
     return HostCall("StorageInfoImpl.GetHlfsFileSystems", {filter}, nullptr,
                     [&](State& st) { return HlfsMatching(st, filter); });
 }
 
 std::vector<std::unique_ptr<HlFileSystem>> StorageInfoImpl::GetHlfsFileSystemsList(const std::string& filter)
 {
+    if (HostLinux::Active())
+        return {};
     return HostCall("StorageInfoImpl.GetHlfsFileSystemsList", {filter}, nullptr,
                     [&](State& st) { return HlfsMatching(st, filter); });
 }
 
 std::vector<std::unique_ptr<HostCtl::Storage::UnresolvedHlfsVolume>> StorageInfoImpl::GetUnresolvedVolumes()
 {
+    if (HostLinux::Active())
+        return {};
     return HostCall("StorageInfoImpl.GetUnresolvedVolumes", {}, nullptr, [](State& st) {
         std::vector<std::unique_ptr<HostCtl::Storage::UnresolvedHlfsVolume>> result;
         for (const auto& u : st.unresolvedVolumes)
@@ -400,6 +421,8 @@ std::vector<std::unique_ptr<HostCtl::Storage::UnresolvedHlfsVolume>> StorageInfo
 bool StorageInfoImpl::TryMount(FileSystem::MountOperationOption option, const std::string& uuid,
                                const std::string& label)
 {
+    if (HostLinux::Active())
+        return HostLinux::Storage::TryMount(option, uuid, label);
     Runtime::JournalEntry journal{label, J::array({static_cast<int>(option), uuid, label})};
     return HostCall("StorageInfoImpl.TryMount", {uuid, label}, &journal, [&](State& st) {
         if (!st.tryMount.value_or(false) || (uuid.empty() && label.empty()))
@@ -427,12 +450,16 @@ bool StorageInfoImpl::TryMount(FileSystem::MountOperationOption option, const st
 
 void StorageInfoImpl::SignalIORM(bool signal)
 {
+    if (HostLinux::Active())
+        return HostLinux::Storage::SignalIORM(signal);
     const Runtime::JournalEntry journal{"", J::array({signal})};
     HostCall("StorageInfoImpl.SignalIORM", {}, &journal, [](State&) {});
 }
 
 void StorageInfoImpl::RescanHlfs()
 {
+    if (HostLinux::Active())
+        return HostLinux::Storage::RescanHlfs();
     const Runtime::JournalEntry journal{"", J::array()};
     HostCall("StorageInfoImpl.RescanHlfs", {}, &journal, [](State& st) {
         if (st.pendingFileSystems.empty() && st.pendingUnresolved.empty())
@@ -458,6 +485,8 @@ void StorageInfoImpl::RescanHlfs()
 
 void StorageInfoImpl::AutoFullMountVolumes()
 {
+    if (HostLinux::Active())
+        return HostLinux::Storage::AutoFullMountVolumes();
     const Runtime::JournalEntry journal{"", J::array()};
     HostCall("StorageInfoImpl.AutoFullMountVolumes", {}, &journal, [](State& st) {
         for (auto& fs : st.fileSystems) {
@@ -472,6 +501,8 @@ void StorageInfoImpl::AutoFullMountVolumes()
 
 void StorageInfoImpl::RestorePsaConfig()
 {
+    if (HostLinux::Active())
+        return HostLinux::Storage::RestorePsaConfig();
     const Runtime::JournalEntry journal{"", J::array()};
     HostCall("StorageInfoImpl.RestorePsaConfig", {}, &journal, [](State&) {});
 }
@@ -483,6 +514,9 @@ std::unique_ptr<NetworkFileSystem> StorageInfoImpl::AddNetworkFileSystem(const s
                                                                          std::uint32_t queueDepth,
                                                                          std::int64_t connections)
 {
+    if (HostLinux::Active())
+        return HostLinux::Storage::AddNetworkFileSystem(host, share, volumeName, knxnicBound, knxnic, queueDepth,
+                                                          connections);
     const Runtime::JournalEntry journal{
         volumeName, J::array({host, share, volumeName, knxnicBound, knxnic, queueDepth, connections})};
     return HostCall("StorageInfoImpl.AddNetworkFileSystem", {host, volumeName}, &journal, [&](State& st) {
@@ -514,6 +548,8 @@ std::unique_ptr<NetworkFileSystem> StorageInfoImpl::AddV41NetworkFileSystem(cons
                                                                             NetworkFileSystem::SecurityType security,
                                                                             bool knxnicBound)
 {
+    if (HostLinux::Active())
+        return HostLinux::Storage::AddV41NetworkFileSystem(hosts, share, volumeName, security, knxnicBound);
     const Runtime::JournalEntry journal{volumeName,
                                         J::array({hosts, share, volumeName, static_cast<int>(security), knxnicBound})};
     const std::string_view firstHost = hosts.empty() ? std::string_view() : std::string_view(hosts.front());
@@ -547,37 +583,51 @@ std::unique_ptr<NetworkFileSystem> StorageInfoImpl::AddV41NetworkFileSystem(cons
 
 void StorageInfoImpl::RemoveNetworkFileSystem(const std::string& volumeName)
 {
+    if (HostLinux::Active())
+        return HostLinux::Storage::RemoveNetworkFileSystem(volumeName, 0);
     RemoveNfs(volumeName, true, true, {volumeName}, Runtime::JournalEntry{volumeName, J::array({volumeName})});
 }
 
 void StorageInfoImpl::RemoveNetworkFileSystem(const std::string& volumeName, NfsVersion version)
 {
+    if (HostLinux::Active())
+        return HostLinux::Storage::RemoveNetworkFileSystem(volumeName, static_cast<int>(version));
     RemoveNfs(volumeName, version == HostCtl::Storage::NFS_VERSION_3, version == HostCtl::Storage::NFS_VERSION_41,
               {volumeName}, Runtime::JournalEntry{volumeName, J::array({volumeName, static_cast<int>(version)})});
 }
 
 std::vector<std::unique_ptr<NetworkFileSystem>> StorageInfoImpl::GetV3NetworkFileSystems(NetworkFileSystemFilter filter)
 {
+    if (HostLinux::Active())
+        return HostLinux::Storage::GetNetworkFileSystems(false, filter);
     return NfsList("StorageInfoImpl.GetV3NetworkFileSystems", FsKind::Nfs, filter);
 }
 
 std::vector<std::unique_ptr<NetworkFileSystem>> StorageInfoImpl::GetV41NetworkFileSystems(NetworkFileSystemFilter filter)
 {
+    if (HostLinux::Active())
+        return HostLinux::Storage::GetNetworkFileSystems(true, filter);
     return NfsList("StorageInfoImpl.GetV41NetworkFileSystems", FsKind::Nfs41, filter);
 }
 
 void StorageInfoImpl::EnterNetworkFileSystemPreUnmount(const std::string& volumeName)
 {
+    if (HostLinux::Active())
+        return HostLinux::Storage::PreUnmount("StorageInfoImpl.EnterNetworkFileSystemPreUnmount", volumeName);
     SetPreUnmount("StorageInfoImpl.EnterNetworkFileSystemPreUnmount", volumeName, true);
 }
 
 void StorageInfoImpl::ExitNetworkFileSystemPreUnmount(const std::string& volumeName)
 {
+    if (HostLinux::Active())
+        return HostLinux::Storage::PreUnmount("StorageInfoImpl.ExitNetworkFileSystemPreUnmount", volumeName);
     SetPreUnmount("StorageInfoImpl.ExitNetworkFileSystemPreUnmount", volumeName, false);
 }
 
 void StorageInfoImpl::AddNasFirewallConfig(const std::string& ipMask, NfsVersion version)
 {
+    if (HostLinux::Active())
+        return HostLinux::Storage::AddNasFirewallConfig(ipMask, version);
     const Runtime::JournalEntry journal{"", J::array({ipMask, static_cast<int>(version)})};
     HostCall("StorageInfoImpl.AddNasFirewallConfig", {ipMask}, &journal, [&](State& st) {
         auto& rules = Ruleset(st, version);
@@ -591,6 +641,8 @@ void StorageInfoImpl::AddNasFirewallConfig(const std::string& ipMask, NfsVersion
 
 void StorageInfoImpl::RemoveNasFirewallConfig(const std::string& ipMask, NfsVersion version)
 {
+    if (HostLinux::Active())
+        return HostLinux::Storage::RemoveNasFirewallConfig(ipMask, version);
     const Runtime::JournalEntry journal{"", J::array({ipMask, static_cast<int>(version)})};
     HostCall("StorageInfoImpl.RemoveNasFirewallConfig", {ipMask}, &journal, [&](State& st) {
         auto& rules = Ruleset(st, version);
@@ -605,6 +657,8 @@ void StorageInfoImpl::RemoveNasFirewallConfig(const std::string& ipMask, NfsVers
 
 std::vector<std::string> StorageInfoImpl::GetNasFirewallConfigs(NfsVersion version)
 {
+    if (HostLinux::Active())
+        return HostLinux::Storage::GetNasFirewallConfigs(version);
     return HostCall("StorageInfoImpl.GetNasFirewallConfigs", {}, nullptr, [&](State& st) {
         if (version != HostCtl::Storage::NFS_VERSION_3 && version != HostCtl::Storage::NFS_VERSION_41)
             Runtime::Throw("Unknown NFS version " + std::to_string(static_cast<int>(version)));
@@ -615,6 +669,8 @@ std::vector<std::string> StorageInfoImpl::GetNasFirewallConfigs(NfsVersion versi
 
 StorageInfoScopedCache::StorageInfoScopedCache(bool refresh)
 {
+    if (HostLinux::Active())
+        return;
     (void)refresh;
     HostCall("StorageInfoScopedCache.new", {}, nullptr, [](State&) {});
 }

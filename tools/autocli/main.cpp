@@ -16,8 +16,10 @@
 #include <system_error>
 #include <vector>
 
+#include "HostChoice.h"
 #include "framework/Frontend.h"
 #include "host/HostSession.h"
+#include "host/linux/LinuxHost.h"
 #include "hostctl/HostCtlException.h"
 #include "quillets/AutoCli.h"
 #include "quillets/QuilletException.h"
@@ -143,9 +145,19 @@ int Run(const std::vector<std::string>& args, std::shared_ptr<NamespaceNode>& tr
         return Quillets::Cli::kExitOk;
     }
 
+    const HostChoice host = ChooseHost(leading.globals);
+    if (!host.error.empty()) {
+        Print(stderr, host.error + "\n");
+        return Quillets::Cli::kExitUsage;
+    }
+
     // The session comes first: registration reads the host's feature switches.
     try {
-        HostSim::OpenSession(leading.globals.statePath ? *leading.globals.statePath : HostSim::DefaultStatePath());
+        if (host.useLinux) {
+            HostLinux::OpenSession();
+        } else {
+            HostSim::OpenSession(leading.globals.statePath ? *leading.globals.statePath : HostSim::DefaultStatePath());
+        }
     } catch (...) {
         return Fail(Quillets::Cli::DescribeException(std::current_exception(), hooks));
     }
