@@ -2,6 +2,7 @@
 
 #include <algorithm>
 
+#include "framework/GlobalOptions.h"
 #include "framework/Text.h"
 
 namespace Quillets::Cli {
@@ -64,14 +65,12 @@ const char* TypeName(MetaType type)
 
 std::string GlobalOptionsHelp()
 {
-    return "Global options:\n" +
-           TwoColumns({{"--state FILE", "Host state file (default: $AUTOCLI_STATE, else the user's state folder)."},
-                       {"--formatter NAME", "Output format: table, simple, json or csv."},
-                       {"--format-param KEY=VALUE", "fields=A,B,C chooses the fields; show-header=false drops the header."},
-                       {"-h, --help", "Help for the path given so far."},
-                       {"--version", "Show the version and exit."},
-                       {"--dump-state", "Print the effective host state as JSON and exit."}},
-                      "  ");
+    std::vector<std::pair<std::string, std::string>> rows;
+    for (const auto& option : GlobalOptionTable()) {
+        std::string names = option.shortName.empty() ? option.longName : option.shortName + ", " + option.longName;
+        rows.emplace_back(option.value.empty() ? names : names + " " + option.value, option.description);
+    }
+    return "Global options:\n" + TwoColumns(rows, "  ");
 }
 
 std::string ResultHelp(Command& command)

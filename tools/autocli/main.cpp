@@ -16,6 +16,7 @@
 #include <system_error>
 #include <vector>
 
+#include "HostValues.h"
 #include "framework/Frontend.h"
 #include "host/HostSession.h"
 #include "hostctl/HostCtlException.h"
@@ -47,6 +48,8 @@ DispatchHooks Hooks()
     hooks.dumpState = [] { return HostSim::DumpState(); };
     hooks.describeException = DescribeHostException;
     hooks.writeOut = [](std::string_view text) { std::fwrite(text.data(), 1, text.size(), stdout); };
+    hooks.valueSources = Autocli::VolumeParameters();
+    hooks.listValues = Autocli::HostValues;
     return hooks;
 }
 
