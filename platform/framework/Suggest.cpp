@@ -47,6 +47,23 @@ std::optional<std::string> Suggest(const std::string& typed, const std::vector<s
     if (typed.empty()) {
         return std::nullopt;
     }
+    // The beginning of one word only is the strongest hint: "snap" is "snapshot", though
+    // "unmap" is two edits away.
+    std::optional<std::string> prefixed;
+    bool ambiguous = false;
+    for (const auto& candidate : candidates) {
+        if (candidate.size() >= typed.size() && EditDistance(typed, candidate.substr(0, typed.size()), 0) == 0 &&
+            candidate != prefixed) {
+            ambiguous = prefixed.has_value();
+            prefixed = candidate;
+            if (ambiguous) {
+                break;
+            }
+        }
+    }
+    if (prefixed && !ambiguous) {
+        return prefixed;
+    }
     std::optional<std::string> closest;
     std::size_t closestDistance = kMaxEdits + 1;
     bool tie = false;
@@ -66,20 +83,10 @@ std::optional<std::string> Suggest(const std::string& typed, const std::vector<s
             tie = true;
         }
     }
-    if (closest && !tie) {
-        return closest;
+    if (tie) {
+        return std::nullopt;
     }
-    // Nothing close, or no one closest: a prefix still names one candidate.
-    std::optional<std::string> prefixed;
-    for (const auto& candidate : candidates) {
-        if (candidate.size() > typed.size() && candidate.compare(0, typed.size(), typed) == 0 && candidate != prefixed) {
-            if (prefixed) {
-                return std::nullopt;
-            }
-            prefixed = candidate;
-        }
-    }
-    return prefixed;
+    return closest;
 }
 
 std::string DidYouMean(const std::string& typed, const std::vector<std::string>& candidates)

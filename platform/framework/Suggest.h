@@ -11,10 +11,10 @@ namespace Quillets::Cli {
 // ASCII case; limit + 1 for anything beyond `limit`.
 std::size_t EditDistance(const std::string& a, const std::string& b, std::size_t limit);
 
-// The candidate the user most likely meant by `typed`, or nothing when no candidate is
-// close or two are equally close. A candidate is close within two edits, and fewer than
-// half its length, so that short words are not matched by chance; failing that, the one
-// candidate that starts with what was typed.
+// The candidate the user most likely meant by `typed`, or nothing when none is close or
+// two are equally close: the one candidate that starts with what was typed, else the
+// closest within two edits (and fewer than half its length, so that short words are not
+// matched by chance). Case is ignored.
 std::optional<std::string> Suggest(const std::string& typed, const std::vector<std::string>& candidates);
 
 // " Did you mean '<x>'?" for Suggest's answer, "" when it has none.
