@@ -123,6 +123,20 @@ std::string ExpandEnum(const ParameterSpec& parameter)
     return text;
 }
 
+std::string ParameterDetails(const ParameterSpec& parameter)
+{
+    std::string details = ExpandEnum(parameter);
+    std::vector<std::string> notes{parameter.IsRequired() ? "required" : "optional"};
+    const auto& constraint = parameter.GetConstraint();
+    if (constraint && constraint->GetType() == ParameterConstraintType::IntRange) {
+        notes.push_back("from " + std::to_string(constraint->GetMin()) + " to " + std::to_string(constraint->GetMax()));
+    }
+    if (parameter.GetType() == ParameterType::StringList) {
+        notes.emplace_back("repeatable");
+    }
+    return details + (details.empty() ? "(" : " (") + Text::Join(notes, ", ") + ")";
+}
+
 std::string NamespaceHelp(const CommandPath& path, const NamespaceNode& node)
 {
     const std::string prefix = path.empty() ? std::string() : JoinPath(path) + " ";
@@ -163,18 +177,8 @@ std::string CommandHelp(const CommandPath& path, Command& command)
         for (const auto& parameter : input->GetParameters()) {
             std::string synopsis = parameter->GetShortName().empty() ? "" : "-" + parameter->GetShortName() + "|";
             synopsis += "--" + parameter->GetName() + ValueSyntax(parameter->GetType());
-            std::string details = ExpandEnum(*parameter);
-            std::vector<std::string> notes{parameter->IsRequired() ? "required" : "optional"};
+            rows.emplace_back(synopsis, ParameterDetails(*parameter));
             const auto& constraint = parameter->GetConstraint();
-            if (constraint && constraint->GetType() == ParameterConstraintType::IntRange) {
-                notes.push_back("from " + std::to_string(constraint->GetMin()) + " to " +
-                                std::to_string(constraint->GetMax()));
-            }
-            if (parameter->GetType() == ParameterType::StringList) {
-                notes.emplace_back("repeatable");
-            }
-            details += (details.empty() ? "(" : " (") + Text::Join(notes, ", ") + ")";
-            rows.emplace_back(synopsis, details);
             if (constraint && constraint->GetType() == ParameterConstraintType::StringEnum) {
                 for (const auto& [value, description] : constraint->GetStringEnum()) {
                     rows.emplace_back("", "  " + value + (description.empty() ? "" : ": " + description));

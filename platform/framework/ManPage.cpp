@@ -6,6 +6,7 @@
 #include "framework/Frontend.h"
 #include "framework/GlobalOptions.h"
 #include "framework/Help.h"
+#include "framework/Render.h"
 #include "framework/Text.h"
 #include "framework/TreeWalk.h"
 #include "quillets/CallSpec.h"
@@ -19,38 +20,11 @@ using CallSpec::ParameterType;
 
 namespace {
 
-void AppendCodePoint(std::string& out, unsigned long value)
+void AppendCodePoint(std::string& out, char32_t value)
 {
     char buffer[16];
-    std::snprintf(buffer, sizeof buffer, "\\[u%04lX]", value);
+    std::snprintf(buffer, sizeof buffer, "\\[u%04lX]", static_cast<unsigned long>(value));
     out += buffer;
-}
-
-// Decodes one UTF-8 sequence at text[pos]; U+FFFD (and one byte on) for anything else.
-unsigned long NextCodePoint(const std::string& text, std::size_t& pos)
-{
-    const auto lead = static_cast<unsigned char>(text[pos]);
-    const std::size_t length = lead >= 0xf0 && lead < 0xf5 ? 4 : lead >= 0xe0 ? 3 : lead >= 0xc2 && lead < 0xe0 ? 2 : 0;
-    if (length == 0 || lead >= 0xf5 || pos + length > text.size()) {
-        ++pos;
-        return 0xfffd;
-    }
-    unsigned long value = lead & (0x7f >> length);
-    for (std::size_t i = 1; i < length; ++i) {
-        const auto next = static_cast<unsigned char>(text[pos + i]);
-        if ((next & 0xc0) != 0x80) {
-            ++pos;
-            return 0xfffd;
-        }
-        value = (value << 6) | (next & 0x3f);
-    }
-    const unsigned long minimum = length == 2 ? 0x80 : length == 3 ? 0x800 : 0x10000;
-    if (value < minimum || value > 0x10ffff || (value >= 0xd800 && value <= 0xdfff)) {
-        ++pos;
-        return 0xfffd;
-    }
-    pos += length;
-    return value;
 }
 
 std::string Bold(const std::string& text) { return "\\fB" + RoffText(text, true) + "\\fR"; }
@@ -101,21 +75,10 @@ std::string ResultSentence(Command& command)
 {
     const auto outputs = command.GetOutputSpec();
     const auto root = outputs->GetRootObject();
-    if (!root) {
-        return {};
-    }
-    if (root->GetType() == MetaObj::MetaType::Bool) {
+    if (root && root->GetType() == MetaObj::MetaType::Bool) {
         return "Result: a boolean (true on success).";
     }
-    std::shared_ptr<MetaObj::MetaStruct> shape;
-    std::string what;
-    if (auto list = std::dynamic_pointer_cast<MetaObj::MetaList>(root)) {
-        shape = list->GetPrototype();
-        what = "a list of ";
-    } else {
-        shape = std::dynamic_pointer_cast<MetaObj::MetaStruct>(root);
-        what = "one ";
-    }
+    const auto shape = RowShape(nullptr, root);
     if (!shape) {
         return {};
     }
@@ -123,7 +86,8 @@ std::string ResultSentence(Command& command)
     for (std::size_t i = 0; i < shape->GetFieldCount(); ++i) {
         titles.push_back(shape->GetFieldTitle(i));
     }
-    return "Result: " + what + shape->GetName() + ", with the fields " + Text::Join(titles, ", ") + ".";
+    return std::string("Result: ") + (root->GetType() == MetaObj::MetaType::List ? "a list of " : "one ") +
+           shape->GetName() + ", with the fields " + Text::Join(titles, ", ") + ".";
 }
 
 std::string CommandSection(const CommandPath& path, Command& command)
@@ -142,21 +106,17 @@ std::string CommandSection(const CommandPath& path, Command& command)
         if (const std::string value = ValueName(parameter->GetType()); !value.empty()) {
             tag += " " + Italic(value);
         }
-        std::vector<std::string> notes{parameter->IsRequired() ? "required" : "optional"};
+        out += Tagged(tag, ParameterDetails(*parameter));
         const auto& constraint = parameter->GetConstraint();
-        if (constraint && constraint->GetType() == ParameterConstraintType::IntRange) {
-            notes.push_back("from " + std::to_string(constraint->GetMin()) + " to " + std::to_string(constraint->GetMax()));
-        }
-        if (parameter->GetType() == ParameterType::StringList) {
-            notes.emplace_back("repeatable");
-        }
-        std::string body = ExpandEnum(*parameter);
-        body += (body.empty() ? "(" : " (") + Text::Join(notes, ", ") + ")";
-        out += Tagged(tag, body);
-        if (constraint && constraint->GetType() == ParameterConstraintType::StringEnum) {
-            out += ".RS\n";
+        if (constraint && constraint->GetType() == ParameterConstraintType::StringEnum &&
+            !constraint->GetStringEnum().empty()) {
+            // One line per value, under the parameter's description.
+            out += ".RS\n.PP\n";
+            bool first = true;
             for (const auto& [value, description] : constraint->GetStringEnum()) {
-                out += Tagged(Bold(value), description.empty() ? std::string() : description);
+                out += (first ? "" : ".br\n") + Bold(value) +
+                       (description.empty() ? std::string() : ": " + RoffText(description)) + "\n";
+                first = false;
             }
             out += ".RE\n";
         }
@@ -251,7 +211,7 @@ std::string RoffText(const std::string& text, bool code)
         const char c = text[pos];
         const auto byte = static_cast<unsigned char>(c);
         if (byte >= 0x80) {
-            AppendCodePoint(out, NextCodePoint(text, pos));
+            AppendCodePoint(out, Text::NextCodePoint(text, pos).value_or(U'\ufffd'));
             previous = 'x';
             continue;
         }

@@ -13,6 +13,12 @@ char Lower(char c) { return static_cast<char>(std::tolower(static_cast<unsigned 
 
 constexpr std::size_t kMaxEdits = 2;
 
+bool StartsWithIgnoringCase(const std::string& text, const std::string& prefix)
+{
+    return text.size() >= prefix.size() &&
+           std::equal(prefix.begin(), prefix.end(), text.begin(), [](char a, char b) { return Lower(a) == Lower(b); });
+}
+
 } // namespace
 
 std::size_t EditDistance(const std::string& a, const std::string& b, std::size_t limit)
@@ -52,8 +58,7 @@ std::optional<std::string> Suggest(const std::string& typed, const std::vector<s
     std::optional<std::string> prefixed;
     bool ambiguous = false;
     for (const auto& candidate : candidates) {
-        if (candidate.size() >= typed.size() && EditDistance(typed, candidate.substr(0, typed.size()), 0) == 0 &&
-            candidate != prefixed) {
+        if (StartsWithIgnoringCase(candidate, typed) && candidate != prefixed) {
             ambiguous = prefixed.has_value();
             prefixed = candidate;
             if (ambiguous) {

@@ -3,15 +3,8 @@
 #include <locale.h>
 #include <wchar.h>
 
-#include <optional>
-
 namespace Quillets::Cli::Text {
 
-namespace {
-
-// Decodes the UTF-8 sequence at text[pos] and moves past it; nothing (and one byte on) for
-// a byte that does not start a well-formed sequence: overlong forms, surrogates and values
-// past U+10FFFF are not well formed.
 std::optional<char32_t> NextCodePoint(std::string_view text, std::size_t& pos)
 {
     const auto byte = [&](std::size_t i) { return static_cast<unsigned char>(text[i]); };
@@ -51,6 +44,8 @@ std::optional<char32_t> NextCodePoint(std::string_view text, std::size_t& pos)
     pos += length;
     return value;
 }
+
+namespace {
 
 // Code points that a terminal may take as a command or a line break rather than as text.
 bool IsControl(char32_t c) { return c < 0x20 || (c >= 0x7f && c <= 0x9f) || c == 0x2028 || c == 0x2029; }

@@ -1,6 +1,7 @@
 #pragma once
 
 #include <cstddef>
+#include <optional>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -20,6 +21,11 @@ std::size_t EscapedWidth(std::string_view text);
 // Columns taken on a terminal: wide East Asian characters take two, combining marks none,
 // a byte that is not UTF-8 one.
 std::size_t DisplayWidth(const std::string& text);
+
+// Decodes the UTF-8 sequence at text[pos] and moves past it; nothing (and one byte on) for
+// a byte that does not start a well-formed sequence: overlong forms, surrogates and values
+// past U+10FFFF are not well formed.
+std::optional<char32_t> NextCodePoint(std::string_view text, std::size_t& pos);
 
 std::string Trim(const std::string& text);
 
