@@ -3,6 +3,8 @@
 #include <locale.h>
 #include <wchar.h>
 
+#include <algorithm>
+
 namespace Quillets::Cli::Text {
 
 std::optional<char32_t> NextCodePoint(std::string_view text, std::size_t& pos)
@@ -109,6 +111,15 @@ private:
     locale_t previous_{};
 };
 
+// Printable ASCII, the common case, needs neither decoding nor escapes.
+bool IsPlainAscii(std::string_view text)
+{
+    return std::all_of(text.begin(), text.end(), [](char c) {
+        const auto byte = static_cast<unsigned char>(c);
+        return byte >= 0x20 && byte < 0x7f;
+    });
+}
+
 constexpr std::size_t kHexEscapeWidth = 4; // \xHH
 
 void AppendHex(std::string& out, unsigned char byte)
@@ -123,6 +134,10 @@ void AppendHex(std::string& out, unsigned char byte)
 
 void AppendEscaped(std::string& out, std::string_view text)
 {
+    if (IsPlainAscii(text)) {
+        out.append(text);
+        return;
+    }
     std::size_t pos = 0;
     while (pos < text.size()) {
         const std::size_t start = pos;
@@ -154,6 +169,9 @@ std::string EscapeControl(const std::string& text)
 
 std::size_t EscapedWidth(std::string_view text)
 {
+    if (IsPlainAscii(text)) {
+        return text.size();
+    }
     const Measure measure;
     std::size_t width = 0;
     std::size_t pos = 0;
