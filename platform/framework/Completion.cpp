@@ -142,18 +142,25 @@ std::string TreeFunctions(const std::shared_ptr<NamespaceNode>& root, const Valu
            values + "\n# __autocli_globals PATH: the global options that may stand after PATH.\n" + globals;
 }
 
-// Walking the words before the cursor is the same in both shells but for how they hold
-// them; WORD(i) and LAST are filled in for each.
-std::string WalkWords(const std::string& word, const std::string& first, const std::string& last,
-                      bool splitsAtEquals)
+// How a shell holds the words of the command line: the expansion of word i is
+// open + i + close; words before the cursor run from `first` to below `last`.
+struct ShellWords {
+    std::string open;
+    std::string close;
+    std::string first;
+    std::string last;
+    bool splitsAtEquals = false; // bash hands "--name=value" over as three words
+};
+
+// Walking the words before the cursor: the path so far, whether it names a command, the
+// option whose value is being typed, and the options that choose the host.
+std::string WalkWords(const ShellWords& words)
 {
-    auto at = [&](const std::string& index) {
-        std::string text = word;
-        text.replace(text.find("I"), 1, index);
-        return text;
-    };
+    const std::string& last = words.last;
+    const bool splitsAtEquals = words.splitsAtEquals;
+    auto at = [&](const std::string& index) { return words.open + index + words.close; };
     std::string out;
-    out += "    for ((i = " + first + "; i < " + last + "; i++)); do\n";
+    out += "    for ((i = " + words.first + "; i < " + last + "; i++)); do\n";
     out += "        word=" + at("i") + "\n";
     if (!splitsAtEquals) {
         out += "        if [[ $word == --*=* ]]; then\n"
@@ -165,7 +172,6 @@ std::string WalkWords(const std::string& word, const std::string& first, const s
            "            __autocli_value \"$path\" \"$word\"\n"
            "            [[ $__autocli_kind == none ]] && continue\n";
     if (splitsAtEquals) {
-        // bash hands "--name=value" over as three words.
         out += "            if ((i + 1 < " + last + ")) && [[ " + at("i + 1") + " == = ]]; then\n"
                "                ((i++))\n"
                "            fi\n";
@@ -243,7 +249,7 @@ _autocli() {
     local -a hostargs=() __autocli_w=()
     COMPREPLY=()
 )";
-    out += WalkWords("${COMP_WORDS[I]}", "1", "COMP_CWORD", true);
+    out += WalkWords({"${COMP_WORDS[", "]}", "1", "COMP_CWORD", true});
     out += R"(    ((lost)) && return 0
     if [[ -n $opt ]]; then
         [[ $cur == = ]] && cur=''
@@ -287,7 +293,7 @@ _autocli() {
     local command=0 lost=0 __autocli_kind
     local -a hostargs __autocli_w offered values
 )";
-    out += WalkWords("${(Q)words[I]}", "2", "CURRENT", false);
+    out += WalkWords({"${(Q)words[", "]}", "2", "CURRENT", false});
     out += R"(    ((lost)) && return 1
     if [[ -z $opt && $cur == --*=* ]]; then
         opt=${cur%%=*}
