@@ -169,7 +169,7 @@ std::string WalkWords(const ShellWords& words)
                "        fi\n";
     }
     out += "        if [[ $word == -?* ]]; then\n"
-           "            __autocli_value \"$path\" \"$word\"\n"
+           "            __autocli_value \"$cmdpath\" \"$word\"\n"
            "            [[ $__autocli_kind == none ]] && continue\n";
     if (splitsAtEquals) {
         out += "            if ((i + 1 < " + last + ")) && [[ " + at("i + 1") + " == = ]]; then\n"
@@ -185,16 +185,16 @@ std::string WalkWords(const ShellWords& words)
            "            continue\n"
            "        fi\n"
            "        ((command || lost)) && continue\n"
-           "        __autocli_children \"$path\"\n"
+           "        __autocli_children \"$cmdpath\"\n"
            "        lost=1\n"
            "        for c in \"${__autocli_w[@]}\"; do\n"
            "            if [[ $c == \"$word\" ]]; then\n"
-           "                path=${path:+$path }$word\n"
+           "                cmdpath=${cmdpath:+$cmdpath }$word\n"
            "                lost=0\n"
            "                break\n"
            "            fi\n"
            "        done\n"
-           "        ((lost)) || ! __autocli_options \"$path\" || command=1\n"
+           "        ((lost)) || ! __autocli_options \"$cmdpath\" || command=1\n"
            "    done\n";
     return out;
 }
@@ -203,7 +203,7 @@ std::string WalkWords(const ShellWords& words)
 const char* const kRemember = R"(# __autocli_remember OPTION VALUE: keeps --state and --host for the host value look-up.
 __autocli_remember() {
     local value=$2
-    [[ -n $path ]] && return
+    [[ -n $cmdpath ]] && return
     [[ $1 == --state || $1 == --host ]] || return
     [[ $value == '~/'* ]] && value=$HOME/${value#'~/'}
     hostargs+=("$1" "$value")
@@ -244,7 +244,7 @@ __autocli_host() {
 }
 
 _autocli() {
-    local cur=${COMP_WORDS[COMP_CWORD]} path='' opt='' word c i REPLY
+    local cur=${COMP_WORDS[COMP_CWORD]} cmdpath='' opt='' word c i REPLY
     local command=0 lost=0 __autocli_kind
     local -a hostargs=() __autocli_w=()
     COMPREPLY=()
@@ -253,7 +253,7 @@ _autocli() {
     out += R"(    ((lost)) && return 0
     if [[ -n $opt ]]; then
         [[ $cur == = ]] && cur=''
-        __autocli_value "$path" "$opt"
+        __autocli_value "$cmdpath" "$opt"
         case $__autocli_kind in
         file)
             compopt -o filenames 2>/dev/null
@@ -266,11 +266,11 @@ _autocli() {
     fi
     if [[ $cur == -* ]]; then
         local -a offered=()
-        ((command)) && __autocli_options "$path" && offered=("${__autocli_w[@]}")
-        __autocli_globals "$path"
+        ((command)) && __autocli_options "$cmdpath" && offered=("${__autocli_w[@]}")
+        __autocli_globals "$cmdpath"
         __autocli_add "${offered[@]}" "${__autocli_w[@]}"
     elif ((!command)); then
-        __autocli_children "$path"
+        __autocli_children "$cmdpath"
         __autocli_add "${__autocli_w[@]}"
     fi
     return 0
@@ -289,7 +289,7 @@ std::string ZshScript(const std::shared_ptr<NamespaceNode>& root, const ValueSou
     out += TreeFunctions(root, sources) + "\n" + kRemember;
     out += R"(
 _autocli() {
-    local cur=${words[CURRENT]} path='' opt='' word c i REPLY
+    local cur=${words[CURRENT]} cmdpath='' opt='' word c i REPLY
     local command=0 lost=0 __autocli_kind
     local -a hostargs __autocli_w offered values
 )";
@@ -300,7 +300,7 @@ _autocli() {
         compset -P '*='
     fi
     if [[ -n $opt ]]; then
-        __autocli_value "$path" "$opt"
+        __autocli_value "$cmdpath" "$opt"
         case $__autocli_kind in
         file) _files ;;
         choice) compadd -- "${__autocli_w[@]}" ;;
@@ -313,11 +313,11 @@ _autocli() {
         return 0
     fi
     if [[ $cur == -* ]]; then
-        ((command)) && __autocli_options "$path" && offered=("${__autocli_w[@]}")
-        __autocli_globals "$path"
+        ((command)) && __autocli_options "$cmdpath" && offered=("${__autocli_w[@]}")
+        __autocli_globals "$cmdpath"
         compadd -- "${offered[@]}" "${__autocli_w[@]}"
     elif ((!command)); then
-        __autocli_children "$path"
+        __autocli_children "$cmdpath"
         compadd -- "${__autocli_w[@]}"
     fi
     return 0

@@ -67,6 +67,7 @@ check bool-values 'false true' "$autocli" storage internal clusteredhdsk set -e 
 check labels-from-state "\\\$\\(touch\\ pwned\\) ds\\ one it\\'s nas-hidden nas1" \
     "$autocli" --state "$S" storage filesystem mount --volume-label ''
 check labels-prefix 'ds\ one' "$autocli" --state "$S" storage filesystem unmount -l d
+PATH=$(dirname -- "$autocli"):$PATH check found-by-name 'ds\ one' autocli --state "$S" storage filesystem mount -l d
 check labels-state-with-equals 'ds\ one' "$autocli" --state = "$S" storage filesystem mount -l d
 check uuids-from-state '22222222-bbbb' "$autocli" --state "$S" storage filesystem mount -u 22
 check nfs-names-skip-hidden 'nas1' "$autocli" --state "$S" storage nfs remove --volume-name ''

@@ -54,6 +54,8 @@ check command-options '--format-param --formatter --help --no-persist --volume-l
 check enum-values 'fixed priority' "$autocli" storage hlfs reclaim config set -m ''
 check enum-after-equals 'high' "$autocli" storage hlfs reclaim config set --reclaim-priority=h
 check labels-from-state '$(touch pwned) ds one' "$autocli" --state "$S" storage filesystem mount -l ''
+# Run by name, autocli is looked up in PATH, which the script must leave alone.
+PATH=$(dirname -- "$autocli"):$PATH check found-by-name 'ds one' autocli --state "$S" storage filesystem mount -l d
 check state-with-equals 'ds one' "$autocli" --state="$S" storage filesystem unmount --volume-label d
 check state-file '<files>' "$autocli" --state ''
 check unknown-word-offers-nothing '' "$autocli" storage bogus ''
