@@ -1,8 +1,13 @@
 #include "framework/Frontend.h"
 
 #include "framework/Help.h"
+#include "framework/ManPage.h"
 #include "framework/Render.h"
+#include "framework/Suggest.h"
+#include "framework/Text.h"
 #include "quillets/QuilletException.h"
+
+#include <algorithm>
 
 #ifndef STORAGECLI_VERSION
 #define STORAGECLI_VERSION "0.1.0"
@@ -67,6 +72,52 @@ CliOutcome RunCommand(const Invocation& inv, const DispatchHooks& hooks)
     return outcome;
 }
 
+std::string CommandList(const std::shared_ptr<AutoCli::NamespaceNode>& root)
+{
+    std::string out;
+    ForEachCommand(root, [&](const CommandPath& path, const std::shared_ptr<AutoCli::Command>&) {
+        out += Text::EscapeControl(JoinPath(path)) + "\n";
+    });
+    return out;
+}
+
+// One value per line, in order, each once; a value that could not stand on one line of its
+// own is left out rather than split.
+CliOutcome ValueList(const std::string& kind, const DispatchHooks& hooks)
+{
+    CliOutcome outcome;
+    std::vector<std::string> kinds;
+    for (const auto& [parameter, known] : hooks.valueSources) {
+        if (std::find(kinds.begin(), kinds.end(), known) == kinds.end()) {
+            kinds.push_back(known);
+        }
+    }
+    std::optional<std::vector<std::string>> values;
+    if (std::find(kinds.begin(), kinds.end(), kind) != kinds.end() && hooks.listValues) {
+        try {
+            values = hooks.listValues(kind);
+        } catch (...) {
+            outcome.err = DescribeException(std::current_exception(), hooks) + "\n";
+            outcome.exitCode = kExitErrors;
+            return outcome;
+        }
+    }
+    if (!values) {
+        outcome.err = "Unknown value list '" + Text::EscapeControl(kind) + "': use " + Text::Join(kinds, ", ") + "." +
+                      DidYouMean(kind, kinds) + "\n";
+        outcome.exitCode = kExitUsage;
+        return outcome;
+    }
+    std::sort(values->begin(), values->end());
+    values->erase(std::unique(values->begin(), values->end()), values->end());
+    for (const auto& value : *values) {
+        if (!value.empty() && value == Text::EscapeControl(value)) {
+            outcome.out += value + "\n";
+        }
+    }
+    return outcome;
+}
+
 } // namespace
 
 CliOutcome RunInvocation(const Invocation& inv, const DispatchHooks& hooks)
@@ -94,6 +145,17 @@ CliOutcome RunInvocation(const Invocation& inv, const DispatchHooks& hooks)
                 outcome.err = DescribeException(std::current_exception(), hooks) + "\n";
                 outcome.exitCode = kExitErrors;
             }
+            return outcome;
+        case Invocation::Action::ListCommands:
+            outcome.out = CommandList(inv.node);
+            return outcome;
+        case Invocation::Action::Completion:
+            outcome.out = CompletionScript(inv.globals.completionShell.value_or(""), inv.node, hooks.valueSources);
+            return outcome;
+        case Invocation::Action::ListValues:
+            return ValueList(inv.globals.valueList.value_or(""), hooks);
+        case Invocation::Action::ManPage:
+            outcome.out = ManPage(inv.node);
             return outcome;
         case Invocation::Action::Help:
             outcome.out = HelpText(inv.path, inv.node);

@@ -8,6 +8,7 @@
 #include <string_view>
 #include <vector>
 
+#include "framework/Completion.h"
 #include "framework/Parser.h"
 #include "quillets/AutoCli.h"
 
@@ -36,6 +37,10 @@ struct DispatchHooks {
     // When set, a command's printed result goes here as it is produced instead of into
     // CliOutcome::out, so a large result is never held as one text.
     std::function<void(std::string_view)> writeOut;
+    // For completion: the parameters whose values name something on the host, and the host's
+    // values of each such kind now (nothing for a kind it does not know; may throw).
+    ValueSources valueSources;
+    std::function<std::optional<std::vector<std::string>>(const std::string& kind)> listValues;
 };
 
 std::string VersionText();

@@ -2,6 +2,7 @@
 
 #include <algorithm>
 
+#include "framework/GlobalOptions.h"
 #include "framework/Text.h"
 
 namespace Quillets::Cli {
@@ -64,15 +65,12 @@ const char* TypeName(MetaType type)
 
 std::string GlobalOptionsHelp()
 {
-    return "Global options:\n" +
-           TwoColumns({{"--state FILE", "Host state file (default: $AUTOCLI_STATE, else the user's state folder)."},
-                       {"--host sim|linux", "The simulated host, or this machine (default: $AUTOCLI_HOST, else sim)."},
-                       {"--formatter NAME", "Output format: table, simple, json or csv."},
-                       {"--format-param KEY=VALUE", "fields=A,B,C chooses the fields; show-header=false drops the header."},
-                       {"-h, --help", "Help for the path given so far."},
-                       {"--version", "Show the version and exit."},
-                       {"--dump-state", "Print the effective host state as JSON and exit."}},
-                      "  ");
+    std::vector<std::pair<std::string, std::string>> rows;
+    for (const auto& option : GlobalOptionTable()) {
+        std::string names = option.shortName.empty() ? option.longName : option.shortName + ", " + option.longName;
+        rows.emplace_back(option.value.empty() ? names : names + " " + option.value, option.description);
+    }
+    return "Global options:\n" + TwoColumns(rows, "  ");
 }
 
 std::string ResultHelp(Command& command)
@@ -125,6 +123,20 @@ std::string ExpandEnum(const ParameterSpec& parameter)
     return text;
 }
 
+std::string ParameterDetails(const ParameterSpec& parameter)
+{
+    std::string details = ExpandEnum(parameter);
+    std::vector<std::string> notes{parameter.IsRequired() ? "required" : "optional"};
+    const auto& constraint = parameter.GetConstraint();
+    if (constraint && constraint->GetType() == ParameterConstraintType::IntRange) {
+        notes.push_back("from " + std::to_string(constraint->GetMin()) + " to " + std::to_string(constraint->GetMax()));
+    }
+    if (parameter.GetType() == ParameterType::StringList) {
+        notes.emplace_back("repeatable");
+    }
+    return details + (details.empty() ? "(" : " (") + Text::Join(notes, ", ") + ")";
+}
+
 std::string NamespaceHelp(const CommandPath& path, const NamespaceNode& node)
 {
     const std::string prefix = path.empty() ? std::string() : JoinPath(path) + " ";
@@ -165,18 +177,8 @@ std::string CommandHelp(const CommandPath& path, Command& command)
         for (const auto& parameter : input->GetParameters()) {
             std::string synopsis = parameter->GetShortName().empty() ? "" : "-" + parameter->GetShortName() + "|";
             synopsis += "--" + parameter->GetName() + ValueSyntax(parameter->GetType());
-            std::string details = ExpandEnum(*parameter);
-            std::vector<std::string> notes{parameter->IsRequired() ? "required" : "optional"};
+            rows.emplace_back(synopsis, ParameterDetails(*parameter));
             const auto& constraint = parameter->GetConstraint();
-            if (constraint && constraint->GetType() == ParameterConstraintType::IntRange) {
-                notes.push_back("from " + std::to_string(constraint->GetMin()) + " to " +
-                                std::to_string(constraint->GetMax()));
-            }
-            if (parameter->GetType() == ParameterType::StringList) {
-                notes.emplace_back("repeatable");
-            }
-            details += (details.empty() ? "(" : " (") + Text::Join(notes, ", ") + ")";
-            rows.emplace_back(synopsis, details);
             if (constraint && constraint->GetType() == ParameterConstraintType::StringEnum) {
                 for (const auto& [value, description] : constraint->GetStringEnum()) {
                     rows.emplace_back("", "  " + value + (description.empty() ? "" : ": " + description));

@@ -19,4 +19,7 @@ std::string CommandHelp(const CommandPath& path, AutoCli::Command& command);
 // A parameter description with %ENUM% replaced by the allowed values of its enumeration.
 std::string ExpandEnum(const CallSpec::ParameterSpec& parameter);
 
+// ExpandEnum's text followed by "(required|optional[, from MIN to MAX][, repeatable])".
+std::string ParameterDetails(const CallSpec::ParameterSpec& parameter);
+
 } // namespace Quillets::Cli

@@ -5,6 +5,8 @@
 #include <charconv>
 #include <set>
 
+#include "framework/GlobalOptions.h"
+#include "framework/Suggest.h"
 #include "framework/Text.h"
 
 namespace Quillets::Cli {
@@ -138,26 +140,46 @@ public:
             globals_.help = true;
             return Match::Taken;
         }
-        const bool early = name == "--state" || name == "--host" || name == "--version" || name == "--dump-state";
+        const bool early = name == "--state" || name == "--host" || name == "--version" || name == "--dump-state" ||
+                           name == "--list-commands" || name == "--completion" || name == "--list-values" ||
+                           name == "--man-page";
         if (early && !leading) {
             error = "Option '" + name + "' must come before the command path.";
             return Match::Failed;
         }
-        if (name == "--version" || name == "--dump-state") {
+        if (name == "--version" || name == "--dump-state" || name == "--list-commands" || name == "--man-page") {
             if (inlineValue) {
                 error = "Option '" + name + "' takes no value.";
                 return Match::Failed;
             }
-            (name == "--version" ? globals_.version : globals_.dumpState) = true;
+            (name == "--version"         ? globals_.version
+             : name == "--dump-state"    ? globals_.dumpState
+             : name == "--list-commands" ? globals_.listCommands
+                                         : globals_.manPage) = true;
             return Match::Taken;
         }
-        if (name != "--state" && name != "--host" && name != "--formatter" && name != "--format-param") {
+        if (name != "--state" && name != "--host" && name != "--formatter" && name != "--format-param" &&
+            name != "--completion" && name != "--list-values") {
             return Match::NotMine;
         }
         std::string value;
         if (!TakeValue(args, i, inlineValue, value)) {
             error = "Option '" + name + "' needs a value.";
             return Match::Failed;
+        }
+        if (name == "--completion" || name == "--list-values") {
+            auto& slot = name == "--completion" ? globals_.completionShell : globals_.valueList;
+            if (slot) {
+                error = "Option '" + name + "' given more than once.";
+                return Match::Failed;
+            }
+            const std::vector<std::string> shells{"bash", "zsh"};
+            if (name == "--completion" && std::find(shells.begin(), shells.end(), value) == shells.end()) {
+                error = "Unknown shell " + Quote(value) + " for '--completion': use bash or zsh." + DidYouMean(value, shells);
+                return Match::Failed;
+            }
+            slot = value;
+            return Match::Taken;
         }
         if (name == "--state") {
             if (globals_.statePath) {
@@ -189,7 +211,8 @@ public:
                 return Match::Failed;
             }
             if (!ParseFormatter(value)) {
-                error = "Unknown formatter " + Quote(value) + ": use table, simple, json or csv.";
+                error = "Unknown formatter " + Quote(value) + ": use table, simple, json or csv." +
+                        DidYouMean(value, {"table", "simple", "json", "csv"});
                 return Match::Failed;
             }
             formatterSeen_ = true;
@@ -232,6 +255,27 @@ public:
         }
         error = Apply(*parameter, args, i, inlineValue);
         return error.empty() ? Match::Taken : Match::Failed;
+    }
+
+    // What a mistyped long option most likely meant: one of the command's own parameters or
+    // a global option that may follow the path.
+    std::string Suggestion(const std::string& arg) const
+    {
+        if (arg.rfind("--", 0) != 0) {
+            return {};
+        }
+        std::vector<std::string> names;
+        for (const auto& parameter : spec_->GetParameters()) {
+            if (parameter && !parameter->GetName().empty()) {
+                names.push_back("--" + parameter->GetName());
+            }
+        }
+        for (const auto& option : GlobalOptionTable()) {
+            if (!option.beforePathOnly) {
+                names.push_back(option.longName);
+            }
+        }
+        return DidYouMean(SplitLong(arg).first, names);
     }
 
     // The first required parameter that was not given, as a message ("" when none).
@@ -357,6 +401,30 @@ private:
     std::set<std::string> given_;
 };
 
+// What a mistyped global option most likely meant; only options valid where it stands.
+std::string GlobalSuggestion(const std::string& arg, bool leading)
+{
+    if (arg.rfind("--", 0) != 0) {
+        return {};
+    }
+    std::vector<std::string> names;
+    for (const auto& option : GlobalOptionTable()) {
+        if (leading || !option.beforePathOnly) {
+            names.push_back(option.longName);
+        }
+    }
+    return DidYouMean(SplitLong(arg).first, names);
+}
+
+std::vector<std::string> ChildNames(const NamespaceNode& node)
+{
+    std::vector<std::string> names;
+    for (const auto& [name, child] : node.GetChildren()) {
+        names.push_back(name);
+    }
+    return names;
+}
+
 std::string HelpHint(const CommandPath& path)
 {
     return path.empty() ? std::string(" See 'autocli --help'.") : " See 'autocli " + JoinPath(path) + " --help'.";
@@ -377,7 +445,7 @@ LeadingGlobals ParseLeadingGlobals(const std::vector<std::string>& args)
             break;
         }
         if (match == Match::NotMine) {
-            result.error = "Unknown option " + Quote(args[i]) + "." + HelpHint({});
+            result.error = "Unknown option " + Quote(args[i]) + "." + GlobalSuggestion(args[i], true) + HelpHint({});
             break;
         }
         if (result.globals.help) {
@@ -413,6 +481,13 @@ Invocation ParseCommandLine(const std::shared_ptr<NamespaceNode>& root, const st
         inv.action = Invocation::Action::DumpState;
         return inv;
     }
+    if (inv.globals.listCommands || inv.globals.completionShell || inv.globals.valueList || inv.globals.manPage) {
+        inv.action = inv.globals.listCommands      ? Invocation::Action::ListCommands
+                     : inv.globals.completionShell ? Invocation::Action::Completion
+                     : inv.globals.valueList       ? Invocation::Action::ListValues
+                                                   : Invocation::Action::ManPage;
+        return inv;
+    }
     if (inv.globals.help) {
         inv.action = Invocation::Action::Help;
         return inv;
@@ -440,9 +515,10 @@ Invocation ParseCommandLine(const std::shared_ptr<NamespaceNode>& root, const st
             }
             if (match == Match::NotMine) {
                 if (inv.command) {
-                    return usage("Unknown parameter " + Quote(arg) + " for '" + JoinPath(inv.path) + "'.");
+                    return usage("Unknown parameter " + Quote(arg) + " for '" + JoinPath(inv.path) + "'." +
+                                 parameters->Suggestion(arg));
                 }
-                return usage("Unknown option " + Quote(arg) + ".");
+                return usage("Unknown option " + Quote(arg) + "." + GlobalSuggestion(arg, false));
             }
             if (inv.globals.help) {
                 inv.action = Invocation::Action::Help;
@@ -456,7 +532,8 @@ Invocation ParseCommandLine(const std::shared_ptr<NamespaceNode>& root, const st
         auto child = inv.node->GetNamespaceNode(arg);
         if (!child) {
             const std::string where = inv.path.empty() ? std::string("at the top level") : "in '" + JoinPath(inv.path) + "'";
-            return usage("Unknown namespace or command " + Quote(arg) + " " + where + ".");
+            return usage("Unknown namespace or command " + Quote(arg) + " " + where + "." +
+                         DidYouMean(arg, ChildNames(*inv.node)));
         }
         inv.path.push_back(arg);
         inv.node = child;
@@ -480,7 +557,7 @@ Invocation ParseCommandLine(const std::shared_ptr<NamespaceNode>& root, const st
     if (inv.globals.output.fields) {
         if (auto problem = CheckFieldSelection(inv.outputSpec->GetRootObject(), *inv.globals.output.fields);
             !problem.empty()) {
-            return usage("Invalid --format-param fields: " + problem + ".");
+            return usage("Invalid --format-param fields: " + problem);
         }
     }
     inv.action = Invocation::Action::Run;

@@ -23,6 +23,10 @@ struct GlobalOptions {
     bool help = false;
     bool version = false;
     bool dumpState = false;
+    bool listCommands = false;
+    std::optional<std::string> completionShell; // --completion: "bash" or "zsh"
+    std::optional<std::string> valueList;       // hidden --list-values KIND, for completion scripts
+    bool manPage = false;                       // hidden --man-page, for the build
 };
 
 // The global options that stand before the path, read on their own: enough to choose the
@@ -35,7 +39,7 @@ struct LeadingGlobals {
 LeadingGlobals ParseLeadingGlobals(const std::vector<std::string>& args);
 
 struct Invocation {
-    enum class Action { Run, Help, Version, DumpState, UsageError };
+    enum class Action { Run, Help, Version, DumpState, ListCommands, Completion, ListValues, ManPage, UsageError };
 
     Action action = Action::UsageError;
     GlobalOptions globals;

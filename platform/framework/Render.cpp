@@ -5,6 +5,7 @@
 
 #include <nlohmann/json.hpp>
 
+#include "framework/Suggest.h"
 #include "framework/Text.h"
 
 namespace Quillets::Cli {
@@ -179,17 +180,17 @@ std::string CheckFieldSelection(const std::shared_ptr<MetaObject>& declared, con
 {
     const auto shape = ShapeOfValue(declared);
     if (!shape) {
-        return "this command's result has no fields to choose from";
+        return "this command's result has no fields to choose from.";
     }
     const auto known = AllFields(shape, Rows{});
     std::vector<std::string> seen;
     for (const auto& title : fields) {
         if (std::find(known.begin(), known.end(), title) == known.end()) {
             return "unknown field '" + Text::EscapeControl(title) + "'; the fields of " + shape->GetName() + " are: " +
-                   Text::Join(known, ", ");
+                   Text::Join(known, ", ") + "." + DidYouMean(title, known);
         }
         if (std::find(seen.begin(), seen.end(), title) != seen.end()) {
-            return "field '" + title + "' is chosen twice";
+            return "field '" + Text::EscapeControl(title) + "' is chosen twice.";
         }
         seen.push_back(title);
     }

@@ -47,7 +47,8 @@ std::shared_ptr<MetaObj::MetaStruct> RowShape(const std::shared_ptr<MetaObj::Met
                                               const std::shared_ptr<MetaObj::MetaObject>& declared);
 
 // Checks the user's field selection against the declared result before anything runs.
-// Returns "" when it is usable, else what is wrong with it.
+// Returns "" when it is usable, else what is wrong with it (sentences, with a suggestion for
+// a mistyped title).
 std::string CheckFieldSelection(const std::shared_ptr<MetaObj::MetaObject>& declared,
                                 const std::vector<std::string>& fields);
 

@@ -12,14 +12,12 @@ using AutoCli::NamespaceNode;
 namespace {
 
 void Walk(const std::shared_ptr<NamespaceNode>& node, CommandPath& path, std::set<const NamespaceNode*>& seen,
-          const std::function<void(const CommandPath&, const std::shared_ptr<Command>&)>& visit)
+          const std::function<void(const CommandPath&, const std::shared_ptr<NamespaceNode>&)>& visit)
 {
     if (!node || !seen.insert(node.get()).second) {
         return;
     }
-    if (auto command = std::dynamic_pointer_cast<Command>(node)) {
-        visit(path, command);
-    }
+    visit(path, node);
     for (const auto& [name, child] : node->GetChildren()) {
         path.push_back(name);
         Walk(child, path, seen, visit);
@@ -31,6 +29,16 @@ void Walk(const std::shared_ptr<NamespaceNode>& node, CommandPath& path, std::se
 
 void ForEachCommand(const std::shared_ptr<NamespaceNode>& root,
                     const std::function<void(const CommandPath&, const std::shared_ptr<Command>&)>& visit)
+{
+    ForEachNode(root, [&](const CommandPath& path, const std::shared_ptr<NamespaceNode>& node) {
+        if (auto command = std::dynamic_pointer_cast<Command>(node)) {
+            visit(path, command);
+        }
+    });
+}
+
+void ForEachNode(const std::shared_ptr<NamespaceNode>& root,
+                 const std::function<void(const CommandPath&, const std::shared_ptr<NamespaceNode>&)>& visit)
 {
     CommandPath path;
     std::set<const NamespaceNode*> seen;

@@ -72,6 +72,8 @@ TEST_F(Autocli, UsageErrorsAreOneLineAndExitTwo)
         {{"storage", "filesystem", "rescan", "--x"}, "Unknown parameter '--x' for 'storage filesystem rescan'."},
         {{"--formatter"}, "Option '--formatter' needs a value."},
         {{"storage"}, "'storage' is a namespace: name one of its commands."},
+        // Bytes that are not UTF-8 are shown as escapes, so the message stays one valid line.
+        {{"storage", "caf\xe9\x1b[2J"}, "Unknown namespace or command 'caf\\xe9\\x1b[2J' in 'storage'. See"},
     };
     for (const auto& run : runs) {
         auto result = RunAutocli(run.args, DemoState());

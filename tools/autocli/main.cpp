@@ -17,6 +17,7 @@
 #include <vector>
 
 #include "HostChoice.h"
+#include "HostValues.h"
 #include "framework/Frontend.h"
 #include "host/HostSession.h"
 #include "host/linux/LinuxHost.h"
@@ -49,6 +50,8 @@ DispatchHooks Hooks()
     hooks.dumpState = [] { return HostSim::DumpState(); };
     hooks.describeException = DescribeHostException;
     hooks.writeOut = [](std::string_view text) { std::fwrite(text.data(), 1, text.size(), stdout); };
+    hooks.valueSources = Autocli::VolumeParameters();
+    hooks.listValues = Autocli::HostValues;
     return hooks;
 }
 
