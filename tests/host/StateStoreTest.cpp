@@ -409,6 +409,48 @@ TEST(StateStore, OnlyAChangeWritesTheDemoHost)
     EXPECT_EQ((Lstat(folder / "xdg/autocli").st_mode & 0777), 0700u);
 }
 
+// Two commands that both started from the demo host: the first to save writes the file; the
+// second must not overwrite it with changes made on a host that no longer is the state.
+TEST(StateStore, SecondFirstSaveOfTheDemoHostIsRefused)
+{
+    Folder folder;
+    const std::string state = folder / "xdg/autocli/host.json";
+    int opened[2], saved[2];
+    ASSERT_EQ(::pipe(opened), 0);
+    ASSERT_EQ(::pipe(saved), 0);
+    const pid_t child = ::fork();
+    if (child == 0) {
+        char byte = 0;
+        HostSim::OpenSession(state);
+        (void)!::write(opened[1], &byte, 1);
+        (void)!::read(saved[0], &byte, 1); // the parent has saved
+        StorageInfoImpl().AddNasFirewallConfig("192.0.2.2", HostCtl::Storage::NFS_VERSION_3);
+        try {
+            HostSim::SaveChanges();
+        } catch (const std::runtime_error& e) {
+            const std::string expected = "Cannot save host state file '" + state +
+                                         "': another process created it while this command ran; run the command again";
+            ::_exit(e.what() == expected ? 0 : 2);
+        }
+        ::_exit(1);
+    }
+    char byte = 0;
+    ASSERT_EQ(::read(opened[0], &byte, 1), 1); // both sessions are on the demo host now
+    HostSim::OpenSession(state);
+    StorageInfoImpl().AddNasFirewallConfig("192.0.2.1", HostCtl::Storage::NFS_VERSION_3);
+    HostSim::SaveChanges();
+    HostSim::CloseSession(); // lets the other one have the lock
+    ASSERT_EQ(::write(saved[1], &byte, 1), 1);
+    int status = 0;
+    ::waitpid(child, &status, 0);
+    EXPECT_TRUE(WIFEXITED(status) && WEXITSTATUS(status) == 0) << "status " << status;
+    const std::string text = ReadFile(state);
+    EXPECT_NE(text.find("192.0.2.1"), std::string::npos);
+    EXPECT_EQ(text.find("192.0.2.2"), std::string::npos);
+    for (int fd : {opened[0], opened[1], saved[0], saved[1]})
+        ::close(fd);
+}
+
 TEST(StateStore, InitStateWritesTheDemoHostOnce)
 {
     Folder folder;
