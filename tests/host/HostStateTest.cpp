@@ -353,15 +353,19 @@ TEST(HostState, ChangesAreSeenByTheNextSessionAndByOtherObjects)
 TEST(HostState, DefaultStatePathFollowsTheEnvironment)
 {
     struct Case {
+        const char* option; // --state
         const char* state;
         const char* xdg;
         const char* home;
         std::string expected;
+        bool named; // then the file must exist
     };
     const Case cases[] = {
-        {"/s/host.json", "/x", "/h", "/s/host.json"},
-        {nullptr, "/x", "/h", "/x/autocli/host.json"},
-        {"", "", "/h", "/h/.local/state/autocli/host.json"},
+        {nullptr, "/s/host.json", "/x", "/h", "/s/host.json", true},
+        {nullptr, nullptr, "/x", "/h", "/x/autocli/host.json", false},
+        {nullptr, "", "", "/h", "/h/.local/state/autocli/host.json", false},
+        {"o.json", "/s/host.json", "/x", "/h", "o.json", true},
+        {"o.json", nullptr, nullptr, "/h", "o.json", true},
     };
     auto set = [](const char* name, const char* value) {
         if (value)
@@ -374,7 +378,13 @@ TEST(HostState, DefaultStatePathFollowsTheEnvironment)
         set("AUTOCLI_STATE", c.state);
         set("XDG_STATE_HOME", c.xdg);
         set("HOME", c.home);
-        EXPECT_EQ(HostSim::DefaultStatePath(), c.expected);
+        const std::string option = c.option ? c.option : "";
+        const auto choice = HostSim::ChooseStatePath(c.option ? &option : nullptr);
+        EXPECT_EQ(choice.path, c.expected);
+        EXPECT_EQ(choice.named, c.named) << c.expected;
+        if (!c.option) {
+            EXPECT_EQ(HostSim::DefaultStatePath(), c.expected);
+        }
     }
     ::unsetenv("AUTOCLI_STATE");
     ::unsetenv("XDG_STATE_HOME");
