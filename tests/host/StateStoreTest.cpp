@@ -363,6 +363,35 @@ const PathCase kPathCases[] = {
 INSTANTIATE_TEST_SUITE_P(Store, StatePathTest, ::testing::ValuesIn(kPathCases),
                          [](const auto& info) { return std::string(info.param.name); });
 
+std::optional<passwd> Nobody();
+
+// A folder another user may not enter hides whether a file is there: that is an error for
+// that user, not the demo host.
+TEST(StateStore, UnreadableFolderIsNotTheDemoHost)
+{
+    const auto nobody = Nobody();
+    if (::geteuid() != 0 || !nobody)
+        GTEST_SKIP() << "needs root and a 'nobody' user to act as the other user";
+    Folder folder;
+    fs::create_directory(folder / "private");
+    ::chmod((folder / "private").c_str(), 0700);
+    const std::string state = folder / "private/host.json";
+    const pid_t child = ::fork();
+    if (child == 0) {
+        if (::setgid(nobody->pw_gid) != 0 || ::setuid(nobody->pw_uid) != 0)
+            ::_exit(1);
+        try {
+            HostSim::OpenSession(state);
+        } catch (const std::runtime_error& e) {
+            ::_exit(std::string(e.what()) == "Cannot use host state file '" + state + "': Permission denied" ? 0 : 2);
+        }
+        ::_exit(3);
+    }
+    int status = 0;
+    ::waitpid(child, &status, 0);
+    EXPECT_TRUE(WIFEXITED(status) && WEXITSTATUS(status) == 0) << "status " << status;
+}
+
 TEST(StateStore, NamedStateFromTheEnvironmentMustExistToo)
 {
     Folder folder;
