@@ -12,7 +12,6 @@
 #include <ostream>
 #include <sstream>
 #include <stdexcept>
-#include <thread>
 #include <unordered_map>
 #include <utility>
 #include <vector>
@@ -21,9 +20,11 @@
 #include <fcntl.h>
 #include <limits.h>
 #include <pwd.h>
+#include <signal.h>
 #include <sys/file.h>
 #include <sys/random.h>
 #include <sys/stat.h>
+#include <sys/time.h>
 #include <unistd.h>
 
 #include "FeatureList.h"
@@ -197,6 +198,44 @@ std::string SecondsText(double seconds)
     return text.str();
 }
 
+void IgnoreAlarm(int) {}
+
+// Waits in the kernel's queue for the lock, so that waiters are served as the lock frees
+// rather than whoever polls first. A short repeating alarm interrupts the wait to check the
+// deadline. Returns 0 once locked, EWOULDBLOCK past the deadline, else the error.
+int WaitForLock(int fd, std::chrono::steady_clock::time_point deadline)
+{
+    struct sigaction quiet{}, oldAction{};
+    quiet.sa_handler = IgnoreAlarm;
+    sigemptyset(&quiet.sa_mask);
+    quiet.sa_flags = 0; // no SA_RESTART: the alarm must end the wait
+    ::sigaction(SIGALRM, &quiet, &oldAction);
+    itimerval tick{}, oldTimer{};
+    tick.it_value.tv_usec = 50000;
+    tick.it_interval.tv_usec = 50000;
+    ::setitimer(ITIMER_REAL, &tick, &oldTimer);
+    int result = 0;
+    for (;;) {
+        if (::flock(fd, LOCK_EX) == 0)
+            break;
+        if (errno != EINTR) {
+            result = errno;
+            break;
+        }
+        if (std::chrono::steady_clock::now() >= deadline) {
+            // One last try: the lock may have come free with the alarm.
+            result = ::flock(fd, LOCK_EX | LOCK_NB) == 0 ? 0 : EWOULDBLOCK;
+            break;
+        }
+    }
+    const itimerval off{};
+    ::setitimer(ITIMER_REAL, &off, nullptr);
+    ::sigaction(SIGALRM, &oldAction, nullptr);
+    if (oldTimer.it_value.tv_sec || oldTimer.it_value.tv_usec)
+        ::setitimer(ITIMER_REAL, &oldTimer, nullptr);
+    return result;
+}
+
 // Takes the exclusive lock on `name` in `dirFd`, creating it with `mode`. The lock file is
 // never followed through a link and never left readable by others, so no other user can
 // hold it.
@@ -204,7 +243,9 @@ int TakeLock(int dirFd, const std::string& name, mode_t mode, const std::string&
              const std::string& lockPath)
 {
     const double timeout = LockTimeoutSeconds();
-    const auto deadline = std::chrono::steady_clock::now() + std::chrono::duration<double>(timeout);
+    const auto deadline = std::chrono::steady_clock::now() +
+                          std::chrono::duration_cast<std::chrono::steady_clock::duration>(
+                              std::chrono::duration<double>(timeout));
     for (;;) {
         Fd fd(::openat(dirFd, name.c_str(), O_RDONLY | O_CREAT | O_NOFOLLOW | O_CLOEXEC | O_NONBLOCK, mode));
         if (fd.Get() < 0) {
@@ -217,15 +258,15 @@ int TakeLock(int dirFd, const std::string& name, mode_t mode, const std::string&
             throw std::runtime_error("Lock file '" + lockPath + "' is not a regular file; remove it");
         if ((st.st_mode & S_IRWXO) && st.st_uid == ::geteuid())
             ::fchmod(fd.Get(), st.st_mode & 0770);
-        while (::flock(fd.Get(), LOCK_EX | LOCK_NB) != 0) {
-            if (errno == EINTR)
-                continue;
-            if (errno != EWOULDBLOCK)
+        if (::flock(fd.Get(), LOCK_EX | LOCK_NB) != 0) {
+            if (errno != EWOULDBLOCK && errno != EINTR)
                 throw std::runtime_error("Cannot lock '" + lockPath + "': " + Errno());
-            if (std::chrono::steady_clock::now() >= deadline)
+            const int error = WaitForLock(fd.Get(), deadline);
+            if (error == EWOULDBLOCK)
                 throw std::runtime_error("Host state file '" + statePath + "' is in use by another process (waited " +
                                          SecondsText(timeout) + " for lock file '" + lockPath + "')");
-            std::this_thread::sleep_for(std::chrono::milliseconds(10));
+            if (error != 0)
+                throw std::runtime_error("Cannot lock '" + lockPath + "': " + Errno(error));
         }
         // A lock file removed or replaced while this process waited locks nothing: take the new one.
         struct stat now{};

@@ -661,13 +661,19 @@ TEST(StateStore, SavesInAFolderOthersControlWriteOnlyTheirOwnFile)
     fs::create_directory(shared);
     ASSERT_EQ(::chown(shared.c_str(), nobody->pw_uid, nobody->pw_gid), 0);
     const std::string state = shared + "/host.json";
-    WriteFile(state, R"({"firewall": {"nfsClient": []}})");
+    // Large enough that each save takes a while, so the other user sees its temporary files.
+    auto text = nlohmann::json::parse(ManyVolumes(500));
+    text["firewall"]["nfsClient"] = nlohmann::json::array();
+    WriteFile(state, text.dump());
     ::chmod(state.c_str(), 0600);
 
+    int seen[2];
+    ASSERT_EQ(::pipe2(seen, O_NONBLOCK), 0);
     const pid_t attacker = ::fork();
     if (attacker == 0) {
         if (::setgid(nobody->pw_gid) != 0 || ::setuid(nobody->pw_uid) != 0)
             ::_exit(1);
+        (void)!::write(seen[1], "r", 1);
         const std::string link = shared + "/.link";
         for (long round = 0;; ++round) {
             DIR* dir = ::opendir(shared.c_str());
@@ -679,6 +685,7 @@ TEST(StateStore, SavesInAFolderOthersControlWriteOnlyTheirOwnFile)
                     names.push_back(entry->d_name);
             ::closedir(dir);
             for (const auto& name : names) {
+                (void)!::write(seen[1], "s", 1);
                 const std::string path = shared + "/" + name;
                 // Replace the name in one step where the kernel allows it, else move it away.
                 ::unlink(link.c_str());
@@ -692,6 +699,10 @@ TEST(StateStore, SavesInAFolderOthersControlWriteOnlyTheirOwnFile)
         }
     }
 
+    ::close(seen[1]);
+    char ready = 0;
+    while (::read(seen[0], &ready, 1) != 1)
+        std::this_thread::sleep_for(std::chrono::milliseconds(1));
     int overwritten = 0, replaced = 0, failed = 0;
     for (int i = 0; i < 300; ++i) {
         try {
@@ -713,6 +724,11 @@ TEST(StateStore, SavesInAFolderOthersControlWriteOnlyTheirOwnFile)
     }
     ::kill(attacker, SIGKILL);
     ::waitpid(attacker, nullptr, 0);
+    long swaps = 0;
+    for (char byte; ::read(seen[0], &byte, 1) == 1;)
+        ++swaps;
+    ::close(seen[0]);
+    EXPECT_GT(swaps, 0) << "the other user never met a temporary file, so nothing was tried";
     EXPECT_EQ(overwritten, 0);
     EXPECT_EQ(replaced, 0);
     EXPECT_EQ(failed, 0);
