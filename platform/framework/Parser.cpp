@@ -124,7 +124,7 @@ std::string ApplyFormatParam(const std::string& text, GlobalOptions& globals, st
 }
 
 // The options every command line may carry. Those that choose the session or end the run
-// early (--state, --host, --version, --dump-state) are taken only before the path.
+// early (--state, --host, --version, --dump-state, --init-state, --list-commands, --completion) are taken only before the path.
 class GlobalReader {
 public:
     explicit GlobalReader(GlobalOptions& globals) : globals_(globals) {}
@@ -141,21 +141,25 @@ public:
             return Match::Taken;
         }
         const bool early = name == "--state" || name == "--host" || name == "--version" || name == "--dump-state" ||
-                           name == "--list-commands" || name == "--completion" || name == "--list-values" ||
-                           name == "--man-page";
+                           name == "--init-state" || name == "--list-commands" || name == "--completion" ||
+                           name == "--list-values" || name == "--man-page";
         if (early && !leading) {
             error = "Option '" + name + "' must come before the command path.";
             return Match::Failed;
         }
-        if (name == "--version" || name == "--dump-state" || name == "--list-commands" || name == "--man-page") {
+        if (name == "--version" || name == "--dump-state" || name == "--init-state" || name == "--dry-run" ||
+            name == "--list-commands" || name == "--man-page") {
             if (inlineValue) {
                 error = "Option '" + name + "' takes no value.";
                 return Match::Failed;
             }
-            (name == "--version"         ? globals_.version
-             : name == "--dump-state"    ? globals_.dumpState
-             : name == "--list-commands" ? globals_.listCommands
-                                         : globals_.manPage) = true;
+            bool& flag = name == "--version"         ? globals_.version
+                         : name == "--dump-state"    ? globals_.dumpState
+                         : name == "--init-state"    ? globals_.initState
+                         : name == "--dry-run"       ? globals_.dryRun
+                         : name == "--list-commands" ? globals_.listCommands
+                                                     : globals_.manPage;
+            flag = true;
             return Match::Taken;
         }
         if (name != "--state" && name != "--host" && name != "--formatter" && name != "--format-param" &&

@@ -27,6 +27,8 @@ struct GlobalOptions {
     std::optional<std::string> completionShell; // --completion: "bash" or "zsh"
     std::optional<std::string> valueList;       // hidden --list-values KIND, for completion scripts
     bool manPage = false;                       // hidden --man-page, for the build
+    bool initState = false; // create the state file from the demo host and stop
+    bool dryRun = false;    // run on the state in memory, save nothing
 };
 
 // The global options that stand before the path, read on their own: enough to choose the

@@ -117,7 +117,7 @@ TEST(HostChoice, FeatureSwitchesOnLinux)
     EXPECT_EQ(pre.exitCode, 2) << pre.out;
     // The simulated demo host has all four on.
     LinuxTest::TempDir sim;
-    const auto demo = LinuxTest::Autocli({"--state", sim.Path() + "/host.json", "storage", "nfs", "add", "--help"});
+    const auto demo = LinuxTest::Autocli({"storage", "nfs", "add", "--help"}, {"XDG_STATE_HOME=" + sim.Path()});
     EXPECT_NE(demo.out.find("knxnic"), std::string::npos) << demo.out;
 }
 

@@ -17,9 +17,13 @@ HostChoice ChooseHost(const Quillets::Cli::GlobalOptions& globals)
     }
     choice.useLinux = name == "linux";
     // The state options belong to the simulated host; on this machine they would mean nothing.
-    if (choice.useLinux && (globals.statePath || globals.dumpState)) {
-        choice.error = std::string("Option '") + (globals.statePath ? "--state" : "--dump-state") +
-                       "' cannot be used with the Linux host. See 'autocli --help'.";
+    // A dry run works on a state held in memory; this machine has none, so it would change things for real.
+    if (choice.useLinux && (globals.statePath || globals.dumpState || globals.initState || globals.dryRun)) {
+        const char* option = globals.statePath    ? "--state"
+                             : globals.dumpState  ? "--dump-state"
+                             : globals.initState  ? "--init-state"
+                                                  : "--dry-run";
+        choice.error = std::string("Option '") + option + "' cannot be used with the Linux host. See 'autocli --help'.";
     }
     return choice;
 }
