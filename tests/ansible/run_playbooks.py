@@ -82,8 +82,13 @@ class Lab:
 
     def inventory(self, states, name):
         path = os.path.join(self.work, name)
-        hosts = {host: {'autocli_state': state} for host, state in states.items()}
+        folders = set(os.path.dirname(state) for state in states.values())
+        check(len(folders) == 1, 'one folder of state files per inventory')
+        # The state path is a template over other variables, as an inventory would write it.
+        hosts = {host: {'autocli_state': '{{ state_dir }}/%s' % os.path.basename(state)}
+                 for host, state in states.items()}
         inventory = {'zephal_hosts': {'hosts': hosts, 'vars': {
+            'state_dir': folders.pop(),
             'ansible_connection': 'local',
             'ansible_python_interpreter': '{{ ansible_playbook_python }}',
             'autocli_path': self.autocli}}}

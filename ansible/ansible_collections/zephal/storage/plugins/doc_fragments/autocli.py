@@ -11,13 +11,13 @@ class ModuleDocFragment(object):
 options:
   autocli_path:
     description:
-      - The autocli program on the managed host, a path or a name looked up in C(PATH).
+      - The autocli program on the managed host, an absolute path or a name looked up in C(PATH).
       - When the task does not set it, the host's inventory variable C(autocli_path) is used.
     type: str
     default: autocli
   autocli_state:
     description:
-      - The host state file autocli works on (its C(--state) option).
+      - The host state file autocli works on (its C(--state) option), an absolute path.
       - When the task does not set it, the host's inventory variable C(autocli_state) is used;
         when neither is set, autocli chooses (C($AUTOCLI_STATE), else its default path).
       - The file must exist; create it once with C(autocli --state FILE --init-state).

@@ -60,14 +60,20 @@ class Autocli:
         self.changed = False
         params = module.params
         path = params['autocli_path']
+        state = params.get('autocli_state')
+        # A relative path would be taken from wherever the module happens to run.
+        if os.sep in path and not os.path.isabs(path):
+            module.fail_json(msg="autocli_path '%s' must be a name or an absolute path" % path)
+        if state and not os.path.isabs(state):
+            module.fail_json(msg="autocli_state '%s' must be an absolute path" % state)
         if os.sep not in path:
             found = module.get_bin_path(path)
             if not found:
                 module.fail_json(msg="autocli not found: '%s' is not in PATH on this host; set autocli_path" % path)
             path = found
         self.base = [path]
-        if params.get('autocli_state'):
-            self.base += ['--state', params['autocli_state']]
+        if state:
+            self.base += ['--state', state]
         if params.get('autocli_host'):
             self.base += ['--host', params['autocli_host']]
         self.base += ['--formatter', 'json']

@@ -113,7 +113,7 @@ def rule_set(cli, namespace):
 def reclaim_settings(cli, volumes):
     settings = []
     for volume in volumes:
-        if not volume['type'].startswith('HLFS'):
+        if not volume.get('type', '').startswith('HLFS'):
             continue
         config = cli.query('storage', 'hlfs', 'reclaim', 'config', 'get', '--volume-uuid', volume['uuid']) or {}
         settings.append(dict(fact_row(config), volume_name=volume['volume_name'], uuid=volume['uuid']))
