@@ -23,9 +23,9 @@ DRY_RUN_MARK = 'Dry run: nothing was saved.'
 
 
 def argument_spec(**options):
-    spec = dict(HOST_OPTIONS)
-    spec.update(options)
-    return spec
+    merged = dict(HOST_OPTIONS)
+    merged.update(options)
+    return merged
 
 
 def fact_key(title):
