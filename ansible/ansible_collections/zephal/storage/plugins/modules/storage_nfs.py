@@ -275,6 +275,7 @@ def main():
         elif existing_version:
             module.warn("Volume '%s' is an NFS v%s volume, not v%s; left as it is" % (name, existing_version, version))
         finish(module, cli, before, after)
+        return
 
     if existing and not existing_version:
         cli.fail("Volume '%s' exists and is not an NFS volume (type %s)" % (name, existing['Type']))
