@@ -1,4 +1,5 @@
-// make-state N: writes a host state with N file systems of mixed kinds to standard output.
+// make-state [--hlfs] N: writes a host state with N file systems of mixed kinds (with --hlfs,
+// HLFS volumes only) to standard output.
 // The output depends only on N, and is laid out as the host itself writes its state file.
 
 #include <cinttypes>
@@ -48,10 +49,10 @@ std::string Mac(Random& r)
     return mac;
 }
 
-ojson FileSystem(Random& r, std::size_t index)
+ojson FileSystem(Random& r, std::size_t index, bool hlfsOnly)
 {
     char name[32];
-    const std::uint64_t kind = r.Below(10);
+    const std::uint64_t kind = hlfsOnly ? r.Below(6) : r.Below(10);
     const std::uint64_t capacity = (r.Below(4096) + 16) << 30;
     const std::uint64_t used = capacity / 100 * r.Below(100);
     ojson fs;
@@ -117,10 +118,12 @@ void WriteIndented(const ojson& value, const char* indent)
 
 int main(int argc, char** argv)
 {
+    const bool hlfsOnly = argc == 3 && std::string(argv[1]) == "--hlfs";
+    const char* number = argc == 2 ? argv[1] : (hlfsOnly ? argv[2] : nullptr);
     char* end = nullptr;
-    const unsigned long long count = argc == 2 ? std::strtoull(argv[1], &end, 10) : 0;
-    if (argc != 2 || !end || *end != '\0' || argv[1][0] == '-') {
-        std::cerr << "usage: make-state N > state.json   (N file systems)\n";
+    const unsigned long long count = number ? std::strtoull(number, &end, 10) : 0;
+    if (!number || !end || *end != '\0' || number[0] == '-') {
+        std::cerr << "usage: make-state [--hlfs] N > state.json   (N file systems; --hlfs: HLFS only)\n";
         return 2;
     }
     std::ios::sync_with_stdio(false);
@@ -132,7 +135,7 @@ int main(int argc, char** argv)
     std::cout << ",\n  \"fileSystems\": [";
     for (std::size_t i = 0; i < count; ++i) {
         std::cout << (i == 0 ? "\n    " : ",\n    ");
-        WriteIndented(FileSystem(r, i), "    ");
+        WriteIndented(FileSystem(r, i, hlfsOnly), "    ");
     }
     std::cout << (count ? "\n  ]" : "]") << ",\n  \"firewall\": ";
     WriteIndented({{"nfsClient", {"10.0.0.0/8"}}, {"nfs41Client", {"10.30.0.0/16"}}}, "  ");

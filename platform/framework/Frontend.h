@@ -40,6 +40,10 @@ struct DispatchHooks {
 
 std::string VersionText();
 
+// While set, AutoCli_ShellCmd runs nothing: it hands its journal line (without the newline)
+// to `sink` and reports success. A dry run uses it; an empty function restores real runs.
+void SetShellCommandSink(std::function<void(const std::string&)> sink);
+
 // The message of any exception; unknown ones are described by `hooks` or generically.
 std::string DescribeException(const std::exception_ptr& error, const DispatchHooks& hooks);
 

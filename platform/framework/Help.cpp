@@ -70,7 +70,9 @@ std::string GlobalOptionsHelp()
                        {"--format-param KEY=VALUE", "fields=A,B,C chooses the fields; show-header=false drops the header."},
                        {"-h, --help", "Help for the path given so far."},
                        {"--version", "Show the version and exit."},
-                       {"--dump-state", "Print the effective host state as JSON and exit."}},
+                       {"--dump-state", "Print the effective host state as JSON and exit."},
+                       {"--init-state", "Create the named state file from the demo host and exit."},
+                       {"--dry-run", "Run the command without saving; list the host calls it made."}},
                       "  ");
 }
 

@@ -122,7 +122,7 @@ std::string ApplyFormatParam(const std::string& text, GlobalOptions& globals, st
 }
 
 // The options every command line may carry. Those that choose the session or end the run
-// early (--state, --version, --dump-state) are taken only before the path.
+// early (--state, --version, --dump-state, --init-state) are taken only before the path.
 class GlobalReader {
 public:
     explicit GlobalReader(GlobalOptions& globals) : globals_(globals) {}
@@ -138,17 +138,22 @@ public:
             globals_.help = true;
             return Match::Taken;
         }
-        const bool early = name == "--state" || name == "--version" || name == "--dump-state";
+        const bool early =
+            name == "--state" || name == "--version" || name == "--dump-state" || name == "--init-state";
         if (early && !leading) {
             error = "Option '" + name + "' must come before the command path.";
             return Match::Failed;
         }
-        if (name == "--version" || name == "--dump-state") {
+        if (name == "--version" || name == "--dump-state" || name == "--init-state" || name == "--dry-run") {
             if (inlineValue) {
                 error = "Option '" + name + "' takes no value.";
                 return Match::Failed;
             }
-            (name == "--version" ? globals_.version : globals_.dumpState) = true;
+            bool& flag = name == "--version"      ? globals_.version
+                         : name == "--dump-state" ? globals_.dumpState
+                         : name == "--init-state" ? globals_.initState
+                                                  : globals_.dryRun;
+            flag = true;
             return Match::Taken;
         }
         if (name != "--state" && name != "--formatter" && name != "--format-param") {

@@ -22,6 +22,8 @@ struct GlobalOptions {
     bool help = false;
     bool version = false;
     bool dumpState = false;
+    bool initState = false; // create the state file from the demo host and stop
+    bool dryRun = false;    // run on the state in memory, save nothing
 };
 
 // The global options that stand before the path, read on their own: enough to choose the

@@ -12,13 +12,34 @@
 
 #include <nlohmann/json.hpp>
 
+#include "framework/Frontend.h"
 #include "quillets/AutoCli.h"
 
 extern char** environ;
 
+namespace {
+std::function<void(const std::string&)> gShellSink;
+} // namespace
+
+namespace Quillets::Cli {
+void SetShellCommandSink(std::function<void(const std::string&)> sink)
+{
+    gShellSink = std::move(sink);
+}
+} // namespace Quillets::Cli
+
 namespace Quillets::AutoCli {
 
 namespace {
+
+std::string JournalLine(const std::string& command, const std::string& input)
+{
+    nlohmann::ordered_json entry;
+    entry["call"] = "AutoCli_ShellCmd";
+    entry["target"] = "";
+    entry["args"] = nlohmann::ordered_json::array({command, input});
+    return entry.dump(-1, ' ', false, nlohmann::json::error_handler_t::replace);
+}
 
 // Appends one line to the call journal named by AUTOCLI_JOURNAL, in the host's journal format.
 void Journal(const std::string& command, const std::string& input)
@@ -27,12 +48,9 @@ void Journal(const std::string& command, const std::string& input)
     if (path == nullptr || *path == '\0') {
         return;
     }
-    nlohmann::ordered_json entry;
-    entry["call"] = "AutoCli_ShellCmd";
-    entry["target"] = "";
-    entry["args"] = nlohmann::ordered_json::array({command, input});
-    const std::string line = entry.dump(-1, ' ', false, nlohmann::json::error_handler_t::replace) + "\n";
-    const int fd = ::open(path, O_WRONLY | O_APPEND | O_CREAT | O_CLOEXEC, 0644);
+    const std::string line = JournalLine(command, input) + "\n";
+    // Never through a link, and never waiting on a pipe nobody reads.
+    const int fd = ::open(path, O_WRONLY | O_APPEND | O_CREAT | O_NOFOLLOW | O_CLOEXEC | O_NONBLOCK, 0644);
     if (fd < 0) {
         return;
     }
@@ -119,8 +137,12 @@ bool MakePipe(Fd& readEnd, Fd& writeEnd)
 
 int AutoCli_ShellCmd(const std::string& command, std::string& output, const std::string& input)
 {
-    Journal(command, input);
     output.clear();
+    if (gShellSink) {
+        gShellSink(JournalLine(command, input));
+        return 0;
+    }
+    Journal(command, input);
 
     Fd inRead, inWrite, outRead, outWrite;
     if (!MakePipe(inRead, inWrite) || !MakePipe(outRead, outWrite)) {

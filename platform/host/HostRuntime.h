@@ -31,7 +31,7 @@ State& CheckedState();
 // Throws the message of the first fault that matches and fires.
 void CheckFault(std::string_view call, std::initializer_list<std::string_view> targets);
 
-// Records that the state in memory differs from the file; Run() persists it.
+// Records that the state in memory differs from the file; the session's save writes it.
 void MarkDirty();
 
 // Look-ups in the state; positions are indexes into fileSystems.
@@ -51,31 +51,25 @@ struct JournalEntry {
 
 void WriteJournal(std::string_view call, const JournalEntry& entry, const std::string* error);
 
-namespace Detail {
-void Commit();   // persists a dirty state; on failure restores the last saved state and throws
-void Abandon();  // a call failed: forget changes it may have made in memory
-} // namespace Detail
-
-// Runs one host call: `body` does the work (checks, faults, changes); changes are persisted
-// before the call returns; journaled calls (`journal` given) are recorded with their outcome.
+// Runs one host call: `body` does the work (checks, faults, changes); journaled calls
+// (`journal` given) are recorded with their outcome as they are made. Changes stay in memory
+// until the session saves them once, at the end of the command. A call checks everything
+// before it changes anything, so a call that throws has changed nothing.
 template <typename F>
 auto Run(std::string_view call, const JournalEntry* journal, F&& body) -> decltype(body())
 {
     try {
         if constexpr (std::is_void_v<decltype(body())>) {
             body();
-            Detail::Commit();
             if (journal)
                 WriteJournal(call, *journal, nullptr);
         } else {
             auto result = body();
-            Detail::Commit();
             if (journal)
                 WriteJournal(call, *journal, nullptr);
             return result;
         }
     } catch (const HostCtlException& e) {
-        Detail::Abandon();
         if (journal)
             WriteJournal(call, *journal, &e.message);
         throw;

@@ -5,16 +5,23 @@
 #include <chrono>
 #include <cstdlib>
 #include <cstring>
-#include <fstream>
+#include <cstdio>
+#include <functional>
+#include <istream>
+#include <ostream>
+#include <utility>
 #include <sstream>
 #include <stdexcept>
 #include <thread>
 #include <unordered_map>
 #include <vector>
 
+#include <dirent.h>
 #include <fcntl.h>
+#include <limits.h>
 #include <pwd.h>
 #include <sys/file.h>
+#include <sys/random.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -50,8 +57,14 @@ struct Indexes {
 
 struct Session {
     bool open = false;
-    std::string path;
+    std::string path;     // as named; messages use it
+    std::string resolved; // the final target of any symlinks
+    std::string dir;      // the resolved file's folder
+    std::string base;     // the resolved file's name in it
+    int dirFd = -1;       // the folder, once it is known to exist
     int lockFd = -1;
+    bool fromFile = false; // the state was read from the file (else the demo host)
+    bool dryRun = false;
     std::optional<std::string> error; // the state file is unusable
     Model::State state;
     bool dirty = false;
@@ -60,10 +73,12 @@ struct Session {
 };
 
 Session gSession;
+std::function<void(const std::string&)> gJournalSink;
+bool gJournalWarned = false;
 
-std::string Errno()
+std::string Errno(int error = errno)
 {
-    return std::strerror(errno);
+    return std::strerror(error);
 }
 
 std::string DirectoryOf(const std::string& path)
@@ -76,47 +91,398 @@ std::string DirectoryOf(const std::string& path)
     return path.substr(0, slash);
 }
 
-// mkdir -p; true when the folder exists afterwards.
-bool MakeDirectories(const std::string& dir)
+std::string BaseOf(const std::string& path)
 {
-    struct stat st{};
-    if (::stat(dir.c_str(), &st) == 0)
-        return S_ISDIR(st.st_mode);
-    if (dir != "/" && dir != "." && !MakeDirectories(DirectoryOf(dir)))
-        return false;
-    return ::mkdir(dir.c_str(), 0755) == 0 || errno == EEXIST;
+    auto slash = path.rfind('/');
+    return slash == std::string::npos ? path : path.substr(slash + 1);
 }
 
-// Reads the state file; a missing file is the demo host. Fills `session.state` or `error`.
+class Fd {
+public:
+    explicit Fd(int fd = -1) : fd_(fd) {}
+    ~Fd() { Reset(); }
+    Fd(const Fd&) = delete;
+    Fd& operator=(const Fd&) = delete;
+    int Get() const { return fd_; }
+    int Release() { return std::exchange(fd_, -1); }
+    void Reset(int fd = -1)
+    {
+        if (fd_ >= 0)
+            ::close(fd_);
+        fd_ = fd;
+    }
+
+private:
+    int fd_;
+};
+
+mode_t CurrentUmask()
+{
+    const mode_t mask = ::umask(0);
+    ::umask(mask);
+    return mask;
+}
+
+// mkdir -p for the state's folders; new folders are private to the user, as state folders are.
+void MakeDirectories(const std::string& dir)
+{
+    struct stat st{};
+    if (::stat(dir.c_str(), &st) == 0) {
+        if (!S_ISDIR(st.st_mode))
+            throw std::runtime_error("'" + dir + "' is not a folder");
+        return;
+    }
+    if (errno != ENOENT)
+        throw std::runtime_error("cannot use folder '" + dir + "': " + Errno());
+    const std::string parent = DirectoryOf(dir);
+    if (parent != dir)
+        MakeDirectories(parent);
+    if (::mkdir(dir.c_str(), 0700) != 0 && errno != EEXIST)
+        throw std::runtime_error("cannot create folder '" + dir + "': " + Errno());
+}
+
+// What a state path leads to, after following symlinks once.
+struct Resolution {
+    std::string target;
+    bool exists = false;
+    struct stat st{};
+};
+
+Resolution Resolve(const std::string& path)
+{
+    Resolution r;
+    r.target = path;
+    for (int hops = 0;; ++hops) {
+        if (::lstat(r.target.c_str(), &r.st) != 0) {
+            if (errno == ENOENT)
+                return r; // nothing there (a dangling link names where the file will be)
+            throw std::runtime_error("Cannot use host state file '" + path + "': " + Errno());
+        }
+        if (!S_ISLNK(r.st.st_mode))
+            break;
+        if (hops >= 40)
+            throw std::runtime_error("Cannot use host state file '" + path + "': " + Errno(ELOOP));
+        std::string link(PATH_MAX, '\0');
+        const ssize_t n = ::readlink(r.target.c_str(), link.data(), link.size());
+        if (n < 0)
+            throw std::runtime_error("Cannot use host state file '" + path + "': " + Errno());
+        link.resize(static_cast<std::size_t>(n));
+        r.target = (!link.empty() && link[0] == '/') ? link : DirectoryOf(r.target) + "/" + link;
+    }
+    if (!S_ISREG(r.st.st_mode))
+        throw std::runtime_error("Host state file '" + path + "' is not a regular file");
+    r.exists = true;
+    return r;
+}
+
+double LockTimeoutSeconds()
+{
+    const char* text = std::getenv("AUTOCLI_LOCK_TIMEOUT");
+    if (!text || !*text)
+        return 10;
+    char* end = nullptr;
+    errno = 0;
+    const double value = std::strtod(text, &end);
+    if (errno != 0 || *end != '\0' || !(value >= 0) || value > 86400 * 365)
+        throw std::runtime_error(std::string("Invalid AUTOCLI_LOCK_TIMEOUT '") + text +
+                                 "': expected a number of seconds");
+    return value;
+}
+
+std::string SecondsText(double seconds)
+{
+    std::ostringstream text;
+    text << seconds << (seconds == 1 ? " second" : " seconds");
+    return text.str();
+}
+
+// Takes the exclusive lock on `name` in `dirFd`, creating it with `mode`. The lock file is
+// never followed through a link and never left readable by others, so no other user can
+// hold it.
+int TakeLock(int dirFd, const std::string& name, mode_t mode, const std::string& statePath,
+             const std::string& lockPath)
+{
+    const double timeout = LockTimeoutSeconds();
+    const auto deadline = std::chrono::steady_clock::now() + std::chrono::duration<double>(timeout);
+    for (;;) {
+        Fd fd(::openat(dirFd, name.c_str(), O_RDONLY | O_CREAT | O_NOFOLLOW | O_CLOEXEC | O_NONBLOCK, mode));
+        if (fd.Get() < 0) {
+            if (errno == ELOOP)
+                throw std::runtime_error("Lock file '" + lockPath + "' is a symbolic link; remove it");
+            throw std::runtime_error("Cannot open lock file '" + lockPath + "': " + Errno());
+        }
+        struct stat st{};
+        if (::fstat(fd.Get(), &st) != 0 || !S_ISREG(st.st_mode))
+            throw std::runtime_error("Lock file '" + lockPath + "' is not a regular file; remove it");
+        if ((st.st_mode & S_IRWXO) && st.st_uid == ::geteuid())
+            ::fchmod(fd.Get(), st.st_mode & 0770);
+        while (::flock(fd.Get(), LOCK_EX | LOCK_NB) != 0) {
+            if (errno == EINTR)
+                continue;
+            if (errno != EWOULDBLOCK)
+                throw std::runtime_error("Cannot lock '" + lockPath + "': " + Errno());
+            if (std::chrono::steady_clock::now() >= deadline)
+                throw std::runtime_error("Host state file '" + statePath + "' is in use by another process (waited " +
+                                         SecondsText(timeout) + " for lock file '" + lockPath + "')");
+            std::this_thread::sleep_for(std::chrono::milliseconds(10));
+        }
+        // A lock file removed or replaced while this process waited locks nothing: take the new one.
+        struct stat now{};
+        if (::fstatat(dirFd, name.c_str(), &now, AT_SYMLINK_NOFOLLOW) == 0 && now.st_dev == st.st_dev &&
+            now.st_ino == st.st_ino)
+            return fd.Release();
+    }
+}
+
+// Writes everything to `fd`; false with errno set when that fails.
+bool WriteAll(int fd, const char* data, std::size_t size)
+{
+    while (size > 0) {
+        const ssize_t n = ::write(fd, data, size);
+        if (n < 0 && errno == EINTR)
+            continue;
+        if (n <= 0) {
+            if (n == 0)
+                errno = EIO;
+            return false;
+        }
+        data += n;
+        size -= static_cast<std::size_t>(n);
+    }
+    return true;
+}
+
+// An output buffer over a descriptor: the state is written only through the descriptor
+// that created its file.
+class FdWriteBuf : public std::streambuf {
+public:
+    explicit FdWriteBuf(int fd) : fd_(fd), buffer_(1 << 16) { setp(buffer_.data(), buffer_.data() + buffer_.size()); }
+    int Error() const { return error_; }
+
+protected:
+    int_type overflow(int_type ch) override
+    {
+        if (!Flush())
+            return traits_type::eof();
+        if (!traits_type::eq_int_type(ch, traits_type::eof())) {
+            *pptr() = traits_type::to_char_type(ch);
+            pbump(1);
+        }
+        return traits_type::not_eof(ch);
+    }
+    int sync() override { return Flush() ? 0 : -1; }
+
+private:
+    bool Flush()
+    {
+        if (error_)
+            return false;
+        if (!WriteAll(fd_, pbase(), static_cast<std::size_t>(pptr() - pbase()))) {
+            error_ = errno;
+            return false;
+        }
+        setp(buffer_.data(), buffer_.data() + buffer_.size());
+        return true;
+    }
+
+    int fd_;
+    std::vector<char> buffer_;
+    int error_ = 0;
+};
+
+// An input buffer over a descriptor.
+class FdReadBuf : public std::streambuf {
+public:
+    explicit FdReadBuf(int fd) : fd_(fd), buffer_(1 << 16) {}
+    int Error() const { return error_; }
+
+protected:
+    int_type underflow() override
+    {
+        if (gptr() < egptr())
+            return traits_type::to_int_type(*gptr());
+        for (;;) {
+            const ssize_t n = ::read(fd_, buffer_.data(), buffer_.size());
+            if (n < 0 && errno == EINTR)
+                continue;
+            if (n < 0)
+                error_ = errno;
+            if (n <= 0)
+                return traits_type::eof();
+            setg(buffer_.data(), buffer_.data(), buffer_.data() + n);
+            return traits_type::to_int_type(*gptr());
+        }
+    }
+
+private:
+    int fd_;
+    std::vector<char> buffer_;
+    int error_ = 0;
+};
+
+// Removes what killed writers left of their temporary files: FILE.tmp.* entries and the
+// contents of such folders. Only names are removed; nothing is followed.
+void RemoveStaleTemporaries(int dirFd, const std::string& base)
+{
+    const std::string prefix = base + ".tmp.";
+    const int listFd = ::dup(dirFd);
+    if (listFd < 0)
+        return;
+    DIR* dir = ::fdopendir(listFd);
+    if (!dir) {
+        ::close(listFd);
+        return;
+    }
+    ::rewinddir(dir);
+    std::vector<std::string> stale;
+    while (const dirent* entry = ::readdir(dir))
+        if (std::string_view(entry->d_name).substr(0, prefix.size()) == prefix)
+            stale.emplace_back(entry->d_name);
+    ::closedir(dir);
+    for (const auto& name : stale) {
+        struct stat st{};
+        if (::fstatat(dirFd, name.c_str(), &st, AT_SYMLINK_NOFOLLOW) != 0)
+            continue;
+        if (!S_ISDIR(st.st_mode)) {
+            ::unlinkat(dirFd, name.c_str(), 0);
+            continue;
+        }
+        const int inner = ::openat(dirFd, name.c_str(), O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC);
+        if (inner < 0)
+            continue;
+        if (DIR* sub = ::fdopendir(inner)) {
+            std::vector<std::string> names;
+            while (const dirent* entry = ::readdir(sub))
+                if (std::strcmp(entry->d_name, ".") != 0 && std::strcmp(entry->d_name, "..") != 0)
+                    names.emplace_back(entry->d_name);
+            for (const auto& file : names)
+                ::unlinkat(::dirfd(sub), file.c_str(), 0);
+            ::closedir(sub);
+        } else {
+            ::close(inner);
+        }
+        ::unlinkat(dirFd, name.c_str(), AT_REMOVEDIR);
+    }
+}
+
+// A fresh FILE.tmp.XXXXXX folder in `dirFd` that only this user can enter. The file inside it
+// cannot be swapped by anyone who can write the state's folder, so the rename below moves
+// exactly what this process wrote.
+std::pair<std::string, int> MakePrivateFolder(int dirFd, const std::string& base)
+{
+    static const char kLetters[] = "abcdefghijklmnopqrstuvwxyzABCDEFGHIJKLMNOPQRSTUVWXYZ0123456789";
+    for (int attempt = 0; attempt < 100; ++attempt) {
+        unsigned char random[6];
+        if (::getrandom(random, sizeof random, 0) != static_cast<ssize_t>(sizeof random))
+            throw std::runtime_error(Errno());
+        std::string name = base + ".tmp.";
+        for (unsigned char byte : random)
+            name += kLetters[byte % (sizeof kLetters - 1)];
+        if (::mkdirat(dirFd, name.c_str(), 0700) != 0) {
+            if (errno == EEXIST)
+                continue;
+            throw std::runtime_error(Errno());
+        }
+        const int fd = ::openat(dirFd, name.c_str(), O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC);
+        struct stat st{};
+        if (fd < 0 || ::fstat(fd, &st) != 0 || st.st_uid != ::geteuid() || (st.st_mode & 077)) {
+            // Someone put another folder in its place: leave it to its owner.
+            if (fd >= 0)
+                ::close(fd);
+            continue;
+        }
+        return {name, fd};
+    }
+    throw std::runtime_error("cannot create a temporary folder");
+}
+
+// The owner, group and mode the saved file gets.
+struct FileIdentity {
+    mode_t mode = 0;
+    std::optional<std::pair<uid_t, gid_t>> owner;
+};
+
+// Writes `state` to `dirFd`/`base` in one step: temporary file written only through its
+// descriptor, given its final mode, flushed, renamed over the old file, folder flushed.
+// With `noReplace`, an existing file is not replaced (StateFileExists). Throws runtime_error
+// with the reason.
+void WriteAtomically(int dirFd, const std::string& base, const Model::State& state, const FileIdentity& identity,
+                     bool noReplace)
+{
+    auto [folderName, folderFd] = MakePrivateFolder(dirFd, base);
+    Fd folder(folderFd);
+    const char* const kFile = "state";
+    bool fileMade = false;
+    auto cleanUp = [&] {
+        if (fileMade)
+            ::unlinkat(folder.Get(), kFile, 0);
+        struct stat mine{}, there{};
+        if (::fstat(folder.Get(), &mine) == 0 &&
+            ::fstatat(dirFd, folderName.c_str(), &there, AT_SYMLINK_NOFOLLOW) == 0 && mine.st_ino == there.st_ino &&
+            mine.st_dev == there.st_dev)
+            ::unlinkat(dirFd, folderName.c_str(), AT_REMOVEDIR);
+    };
+    try {
+        Fd fd(::openat(folder.Get(), kFile, O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, 0600));
+        if (fd.Get() < 0)
+            throw std::runtime_error(Errno());
+        fileMade = true;
+        {
+            FdWriteBuf buffer(fd.Get());
+            std::ostream out(&buffer);
+            Model::Write(state, out);
+            out.flush();
+            if (buffer.Error() || !out)
+                throw std::runtime_error(Errno(buffer.Error() ? buffer.Error() : EIO));
+        }
+        if (identity.owner && ::fchown(fd.Get(), identity.owner->first, identity.owner->second) != 0) {
+            // Another user's file keeps at least its group where this user may set it.
+            (void)::fchown(fd.Get(), static_cast<uid_t>(-1), identity.owner->second);
+        }
+        if (::fchmod(fd.Get(), identity.mode) != 0 || ::fsync(fd.Get()) != 0)
+            throw std::runtime_error(Errno());
+        const int renamed = noReplace
+                                ? ::renameat2(folder.Get(), kFile, dirFd, base.c_str(), RENAME_NOREPLACE)
+                                : ::renameat(folder.Get(), kFile, dirFd, base.c_str());
+        if (renamed != 0) {
+            if (noReplace && errno == EEXIST)
+                throw StateFileExists("exists");
+            throw std::runtime_error(Errno());
+        }
+        fileMade = false;
+        ::fsync(dirFd);
+    } catch (...) {
+        cleanUp();
+        throw;
+    }
+    cleanUp();
+}
+
+// Reads the state file (already locked) into `session`; a bad one is remembered.
 void Load(Session& session)
 {
     session.error.reset();
     session.state = Model::State();
     session.indexes = Indexes();
     session.dirty = false;
+    const std::string what = "Cannot read host state file '" + session.path + "': ";
+    Fd fd(::openat(session.dirFd, session.base.c_str(), O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC));
     struct stat st{};
-    if (::stat(session.path.c_str(), &st) != 0) {
-        if (errno == ENOENT) {
-            session.state = Model::Demo();
-            return;
-        }
-        session.error = "Cannot read host state file '" + session.path + "': " + Errno();
+    if (fd.Get() < 0) {
+        session.error = what + Errno();
         return;
     }
-    if (S_ISDIR(st.st_mode)) {
-        session.error = "Cannot read host state file '" + session.path + "': it is a folder";
+    if (::fstat(fd.Get(), &st) != 0 || !S_ISREG(st.st_mode)) {
+        session.error = "Host state file '" + session.path + "' is not a regular file";
         return;
     }
-    std::ifstream in(session.path, std::ios::binary);
-    if (!in) {
-        session.error = "Cannot read host state file '" + session.path + "': " + Errno();
-        return;
-    }
+    FdReadBuf buffer(fd.Get());
+    std::istream in(&buffer);
     try {
         session.state = Model::Parse(in, session.path);
     } catch (const Model::StateError& e) {
         session.state = Model::State();
-        session.error = e.what();
+        session.error = buffer.Error() ? what + Errno(buffer.Error()) : std::string(e.what());
     }
 }
 
@@ -128,42 +494,31 @@ void ApplyFeatures(const Session& session)
 
 void Save(Session& session)
 {
-    const std::string dir = DirectoryOf(session.path);
-    if (!MakeDirectories(dir))
-        Throw("Cannot save host state file '" + session.path + "': cannot create folder '" + dir + "': " + Errno());
-    std::string temp = session.path + ".tmp.XXXXXX";
-    int fd = ::mkostemp(temp.data(), O_CLOEXEC);
-    if (fd < 0)
-        Throw("Cannot save host state file '" + session.path + "': " + Errno());
-    auto fail = [&](const std::string& why) {
-        ::close(fd);
-        ::unlink(temp.c_str());
-        Throw("Cannot save host state file '" + session.path + "': " + why);
-    };
-    struct stat old{};
-    ::fchmod(fd, ::stat(session.path.c_str(), &old) == 0 ? (old.st_mode & 07777) : 0644);
-    {
-        std::ofstream out(temp, std::ios::binary | std::ios::trunc);
-        std::vector<char> buffer(1 << 16);
-        out.rdbuf()->pubsetbuf(buffer.data(), static_cast<std::streamsize>(buffer.size()));
-        Model::Write(session.state, out);
-        out.flush();
-        if (!out)
-            fail("write failed");
+    FileIdentity identity;
+    if (session.dirFd < 0) {
+        // The demo host's first change: the folder and the lock come into being now.
+        MakeDirectories(session.dir);
+        session.dirFd = ::open(session.dir.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
+        if (session.dirFd < 0)
+            throw std::runtime_error(Errno());
+        session.lockFd = TakeLock(session.dirFd, session.base + ".lock", (0666 & ~CurrentUmask()) & 0770,
+                                  session.path, session.resolved + ".lock");
     }
-    if (::fsync(fd) != 0)
-        fail(Errno());
-    ::close(fd);
-    if (::rename(temp.c_str(), session.path.c_str()) != 0) {
-        std::string why = Errno();
-        ::unlink(temp.c_str());
-        Throw("Cannot save host state file '" + session.path + "': " + why);
+    struct stat st{};
+    if (::fstatat(session.dirFd, session.base.c_str(), &st, AT_SYMLINK_NOFOLLOW) == 0) {
+        if (!session.fromFile)
+            throw std::runtime_error("another process created it while this command ran; run the command again");
+        if (!S_ISREG(st.st_mode))
+            throw std::runtime_error("it is no longer a regular file");
+        identity.mode = st.st_mode & 07777;
+        if (st.st_uid != ::geteuid() || st.st_gid != ::getegid())
+            identity.owner = std::make_pair(st.st_uid, st.st_gid);
+    } else {
+        identity.mode = 0666 & ~CurrentUmask();
     }
-    int dirFd = ::open(dir.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
-    if (dirFd >= 0) {
-        ::fsync(dirFd);
-        ::close(dirFd);
-    }
+    RemoveStaleTemporaries(session.dirFd, session.base);
+    WriteAtomically(session.dirFd, session.base, session.state, identity, false);
+    session.fromFile = true;
 }
 
 void BuildIndexes(Session& session)
@@ -311,51 +666,31 @@ void InvalidateIndexes()
 void WriteJournal(std::string_view call, const JournalEntry& entry, const std::string* error)
 {
     const char* path = std::getenv("AUTOCLI_JOURNAL");
-    if (!path || !*path)
+    if (!gJournalSink && (!path || !*path))
         return;
     nlohmann::ordered_json line = {{"call", call}, {"target", entry.target}, {"args", entry.args}};
     if (error)
         line["error"] = *error;
-    std::string text = line.dump(-1, ' ', false, nlohmann::ordered_json::error_handler_t::replace) + "\n";
-    int fd = ::open(path, O_WRONLY | O_CREAT | O_APPEND | O_CLOEXEC, 0644);
-    if (fd < 0)
-        return; // the journal is a record for tests and diagnosis; it never fails a host call
-    const char* data = text.data();
-    std::size_t left = text.size();
-    while (left > 0) {
-        ssize_t n = ::write(fd, data, left);
-        if (n < 0 && errno == EINTR)
-            continue;
-        if (n <= 0)
-            break;
-        data += n;
-        left -= static_cast<std::size_t>(n);
-    }
-    ::close(fd);
-}
-
-namespace Detail {
-
-void Commit()
-{
-    if (!gSession.dirty)
+    std::string text = line.dump(-1, ' ', false, nlohmann::ordered_json::error_handler_t::replace);
+    if (gJournalSink) {
+        gJournalSink(text);
         return;
-    try {
-        Save(gSession);
-        gSession.dirty = false;
-    } catch (const HostCtlException&) {
-        Load(gSession); // what is on disk is the truth; a failed call changes nothing
-        throw;
+    }
+    text += "\n";
+    // Never through a link, and never waiting on a pipe nobody reads.
+    Fd fd(::open(path, O_WRONLY | O_APPEND | O_CREAT | O_NOFOLLOW | O_CLOEXEC | O_NONBLOCK, 0644));
+    if (fd.Get() < 0 || !WriteAll(fd.Get(), text.data(), text.size())) {
+        // The journal is a record for tests and diagnosis; it never fails a host call, but
+        // a journal that cannot be written is said once.
+        if (!gJournalWarned) {
+            gJournalWarned = true;
+            const std::string warning = std::string("Cannot write the call journal '") + path + "': " +
+                                        (errno == ELOOP ? std::string("it is a symbolic link") : Errno()) + "\n";
+            (void)!::write(STDERR_FILENO, warning.data(), warning.size());
+        }
     }
 }
 
-void Abandon()
-{
-    if (gSession.dirty && gSession.open)
-        Load(gSession);
-}
-
-} // namespace Detail
 } // namespace Runtime
 
 std::string DefaultStatePath()
@@ -370,48 +705,120 @@ std::string DefaultStatePath()
     return base + "/autocli/host.json";
 }
 
-void OpenSession(const std::string& stateFile)
+StateChoice ChooseStatePath(const std::string* option)
+{
+    if (option)
+        return {*option, true};
+    const char* state = std::getenv("AUTOCLI_STATE");
+    return {DefaultStatePath(), state && *state};
+}
+
+void OpenSession(const std::string& stateFile, const SessionOptions& options)
 {
     CloseSession();
     if (stateFile.empty())
         throw std::runtime_error("No host state file was given");
-    const std::string lockPath = stateFile + ".lock";
-    const std::string dir = DirectoryOf(stateFile);
-    if (!MakeDirectories(dir))
-        throw std::runtime_error("Cannot create folder '" + dir + "' for host state file '" + stateFile +
-                                 "': " + Errno());
-    int fd = ::open(lockPath.c_str(), O_RDWR | O_CREAT | O_CLOEXEC, 0644);
-    if (fd < 0)
-        throw std::runtime_error("Cannot open lock file '" + lockPath + "': " + Errno());
-    const auto deadline = std::chrono::steady_clock::now() + std::chrono::seconds(10);
-    while (::flock(fd, LOCK_EX | LOCK_NB) != 0) {
-        if ((errno != EWOULDBLOCK && errno != EINTR) || std::chrono::steady_clock::now() >= deadline) {
-            const bool busy = errno == EWOULDBLOCK;
-            std::string why = Errno();
-            ::close(fd);
-            if (busy)
-                throw std::runtime_error("Host state file '" + stateFile +
-                                         "' is in use by another process (waited 10 seconds for lock file '" +
-                                         lockPath + "')");
-            throw std::runtime_error("Cannot lock '" + lockPath + "': " + why);
+    Resolution where = Resolve(stateFile);
+    Session& session = gSession;
+    session.path = stateFile;
+    session.resolved = where.target;
+    session.dir = DirectoryOf(where.target);
+    session.base = BaseOf(where.target);
+    session.dryRun = options.dryRun;
+    if (where.exists) {
+        session.dirFd = ::open(session.dir.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
+        if (session.dirFd < 0) {
+            const std::string why = Errno();
+            CloseSession();
+            throw std::runtime_error("Cannot use host state file '" + stateFile + "': " + why);
         }
-        std::this_thread::sleep_for(std::chrono::milliseconds(20));
+        try {
+            session.lockFd = TakeLock(session.dirFd, session.base + ".lock", where.st.st_mode & 0770, stateFile,
+                                      where.target + ".lock");
+        } catch (...) {
+            CloseSession();
+            throw;
+        }
+        // What is there now, under the lock, is what counts.
+        struct stat st{};
+        if (::fstatat(session.dirFd, session.base.c_str(), &st, AT_SYMLINK_NOFOLLOW) != 0) {
+            if (errno != ENOENT) {
+                const std::string why = Errno();
+                CloseSession();
+                throw std::runtime_error("Cannot use host state file '" + stateFile + "': " + why);
+            }
+            where.exists = false;
+        } else if (!S_ISREG(st.st_mode)) {
+            CloseSession();
+            throw std::runtime_error("Host state file '" + stateFile + "' is not a regular file");
+        }
     }
-    gSession.path = stateFile;
-    gSession.lockFd = fd;
-    gSession.open = true;
-    gSession.faultHits.clear();
-    Load(gSession);
-    ApplyFeatures(gSession);
+    if (!where.exists && options.mustExist) {
+        CloseSession();
+        throw StateFileMissing("State file '" + stateFile + "' does not exist.");
+    }
+    session.open = true;
+    session.faultHits.clear();
+    if (where.exists) {
+        session.fromFile = true;
+        Load(session);
+    } else {
+        session.state = Model::Demo();
+    }
+    ApplyFeatures(session);
+}
+
+void SaveChanges()
+{
+    Session& session = gSession;
+    if (!session.open || !session.dirty || session.dryRun || session.error)
+        return;
+    try {
+        Save(session);
+        session.dirty = false;
+    } catch (const std::exception& e) {
+        throw std::runtime_error("Cannot save host state file '" + session.path + "': " + e.what());
+    }
 }
 
 void CloseSession()
 {
     if (gSession.lockFd >= 0)
         ::close(gSession.lockFd); // releases the lock
+    if (gSession.dirFd >= 0)
+        ::close(gSession.dirFd);
     gSession = Session();
     for (auto& byte : gFeatureBytes)
         byte = 0;
+}
+
+void InitState(const std::string& stateFile)
+{
+    CloseSession();
+    const std::string exists = "Host state file '" + stateFile + "' already exists; --init-state leaves it as it is.";
+    if (stateFile.empty())
+        throw std::runtime_error("No host state file was given");
+    struct stat st{};
+    if (::lstat(stateFile.c_str(), &st) == 0)
+        throw StateFileExists(exists);
+    if (errno != ENOENT)
+        throw std::runtime_error("Cannot use host state file '" + stateFile + "': " + Errno());
+    const std::string dir = DirectoryOf(stateFile);
+    const std::string base = BaseOf(stateFile);
+    try {
+        MakeDirectories(dir);
+        Fd dirFd(::open(dir.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+        if (dirFd.Get() < 0)
+            throw std::runtime_error(Errno());
+        const mode_t mode = 0666 & ~CurrentUmask();
+        Fd lock(TakeLock(dirFd.Get(), base + ".lock", mode & 0770, stateFile, stateFile + ".lock"));
+        RemoveStaleTemporaries(dirFd.Get(), base);
+        WriteAtomically(dirFd.Get(), base, Model::Demo(), FileIdentity{mode, std::nullopt}, true);
+    } catch (const StateFileExists&) {
+        throw StateFileExists(exists);
+    } catch (const std::exception& e) {
+        throw std::runtime_error("Cannot create host state file '" + stateFile + "': " + e.what());
+    }
 }
 
 std::string DumpState()
@@ -420,6 +827,11 @@ std::string DumpState()
     std::ostringstream out;
     Model::Write(state, out);
     return std::move(out).str(); // hands over the buffer: a large state is not copied again
+}
+
+void SetJournalSink(std::function<void(const std::string&)> sink)
+{
+    gJournalSink = std::move(sink);
 }
 
 } // namespace HostSim

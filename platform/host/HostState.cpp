@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <cinttypes>
 #include <cstdio>
+#include <cstring>
 #include <functional>
 #include <istream>
 #include <limits>
@@ -19,6 +20,20 @@ namespace {
 using json = nlohmann::json;
 using ojson = nlohmann::ordered_json;
 
+constexpr std::size_t kQuoteLimit = 80;
+
+// A text quoted in a message: long ones are cut, so a huge key or value never makes a huge
+// message. The cut never splits a UTF-8 sequence.
+std::string Cut(std::string_view text)
+{
+    if (text.size() <= kQuoteLimit)
+        return std::string(text);
+    std::size_t end = kQuoteLimit;
+    while (end > 0 && (static_cast<unsigned char>(text[end]) & 0xC0) == 0x80)
+        --end;
+    return std::string(text.substr(0, end)) + "...";
+}
+
 // Where a value sits in the state, built into text only when a message needs it.
 struct Where {
     const Where* parent = nullptr;
@@ -33,7 +48,7 @@ struct Where {
         } else {
             if (!text.empty())
                 text += ".";
-            text += key;
+            text += Cut(key);
         }
         return text;
     }
@@ -150,7 +165,7 @@ std::string CanonicalMac(const json& v, const Where& w)
     if (text.size() != 17 ||
         std::sscanf(text.c_str(), "%2x:%2x:%2x:%2x:%2x:%2x%c", &bytes[0], &bytes[1], &bytes[2], &bytes[3],
                     &bytes[4], &bytes[5], &tail) != 6)
-        Fail(w, "expected a MAC address like 00:1e:67:c4:d2:a8, found '" + text + "'");
+        Fail(w, "expected a MAC address like 00:1e:67:c4:d2:a8, found '" + Cut(text) + "'");
     char out[18];
     std::snprintf(out, sizeof out, "%02x:%02x:%02x:%02x:%02x:%02x", bytes[0], bytes[1], bytes[2], bytes[3],
                   bytes[4], bytes[5]);
@@ -670,12 +685,78 @@ void ReadTopKey(State& st, const std::string& key, const json& value, const Wher
     }
 }
 
+// The state text as the JSON reader sees it, with the one check the reader does not make
+// (it takes a NUL byte for the end of the input, which would silently drop the rest of the
+// file) and enough bookkeeping to give any offset a line and a column.
+class CheckedInput : public std::streambuf {
+public:
+    explicit CheckedInput(std::streambuf* source) : source_(source), buffer_(1 << 16) {}
+
+    // Line and column (the count of characters read on that line, as the reader counts
+    // them) of offset `position`, which must not be before the current chunk.
+    std::pair<std::uint64_t, std::uint64_t> Locate(std::uint64_t position) const
+    {
+        std::uint64_t lines = linesBefore_;
+        std::uint64_t lineStart = lineStartBefore_;
+        const std::uint64_t end = std::min<std::uint64_t>(position - std::min(position, chunkStart_), length_);
+        for (std::uint64_t i = 0; i < end; ++i) {
+            if (buffer_[i] == '\n') {
+                ++lines;
+                lineStart = chunkStart_ + i + 1;
+            }
+        }
+        return {lines + 1, position >= lineStart ? position - lineStart : 0};
+    }
+
+    std::string Place(std::uint64_t position) const
+    {
+        const auto [line, column] = Locate(position);
+        return "line " + std::to_string(line) + ", column " + std::to_string(column);
+    }
+
+protected:
+    int_type underflow() override
+    {
+        if (gptr() < egptr())
+            return traits_type::to_int_type(*gptr());
+        if (nul_ != std::string::npos)
+            throw PlaceError{Place(chunkStart_ + nul_ + 1), "a NUL byte is not allowed in a state file"};
+        for (std::size_t i = 0; i < length_; ++i) {
+            if (buffer_[i] == '\n') {
+                ++linesBefore_;
+                lineStartBefore_ = chunkStart_ + i + 1;
+            }
+        }
+        chunkStart_ += length_;
+        const std::streamsize n = source_->sgetn(buffer_.data(), static_cast<std::streamsize>(buffer_.size()));
+        length_ = n > 0 ? static_cast<std::size_t>(n) : 0;
+        if (length_ == 0)
+            return traits_type::eof();
+        const void* nul = std::memchr(buffer_.data(), '\0', length_);
+        nul_ = nul ? static_cast<std::size_t>(static_cast<const char*>(nul) - buffer_.data()) : std::string::npos;
+        if (nul_ == 0)
+            throw PlaceError{Place(chunkStart_ + 1), "a NUL byte is not allowed in a state file"};
+        setg(buffer_.data(), buffer_.data(), buffer_.data() + (nul ? nul_ : length_));
+        return traits_type::to_int_type(*gptr());
+    }
+
+private:
+    std::streambuf* source_;
+    std::vector<char> buffer_;
+    std::size_t length_ = 0;
+    std::size_t nul_ = std::string::npos;
+    std::uint64_t chunkStart_ = 0;
+    std::uint64_t linesBefore_ = 0;
+    std::uint64_t lineStartBefore_ = 0;
+};
+
 // Builds the document like a DOM parser, except that each element of the top-level
 // "fileSystems" array is converted to a record as soon as it is complete and then dropped,
-// so a large host never exists twice in memory.
+// so a large host never exists twice in memory. A key given twice in one object is refused:
+// which of the two was meant cannot be known.
 class StreamingReader {
 public:
-    explicit StreamingReader(State& state) : state_(state) {}
+    StreamingReader(State& state, const CheckedInput& input) : state_(state), input_(input) {}
 
     json root;
 
@@ -690,18 +771,23 @@ public:
     bool start_object(std::size_t)
     {
         stack_.push_back(Place(json::value_t::object));
+        frames_.push_back(Frame{false, {}, 0});
         return true;
     }
     bool key(json::string_t& k)
     {
+        if (stack_.back()->contains(k))
+            throw PlaceError{PathTo(k), "this key is given twice"};
         if (stack_.size() == 1)
             topKey_ = k;
+        frames_.back().key = k;
         slot_ = &(*stack_.back())[k];
         return true;
     }
     bool end_object()
     {
         stack_.pop_back();
+        frames_.pop_back();
         Completed();
         return true;
     }
@@ -709,30 +795,65 @@ public:
     {
         json* array = Place(json::value_t::array);
         stack_.push_back(array);
+        frames_.push_back(Frame{true, {}, 0});
         if (stack_.size() == 2 && stack_[0]->is_object() && topKey_ == "fileSystems") {
             streamed_ = array;
             streamedCount_ = 0;
-            state_.fileSystems.clear(); // a repeated key: the last one counts
         }
         return true;
     }
     bool end_array()
     {
         stack_.pop_back();
+        frames_.pop_back();
         Completed();
         return true;
     }
-    bool parse_error(std::size_t, const std::string&, const nlohmann::detail::exception& ex)
+    bool parse_error(std::size_t position, const std::string& token, const nlohmann::detail::exception& ex)
     {
         std::string text = ex.what();
         if (auto close = text.find("] "); text.rfind("[json.exception", 0) == 0 && close != std::string::npos)
             text.erase(0, close + 2);
-        throw PlaceError{"", text};
+        // The reader's own place, if it gave one, is replaced by the same place in this
+        // file's form; a token it quotes is cut like every other quoted text.
+        if (text.rfind("parse error at line ", 0) == 0) {
+            if (auto colon = text.find(": "); colon != std::string::npos)
+                text.erase(0, colon + 2);
+        }
+        if (!token.empty() && token.size() > kQuoteLimit) {
+            if (auto at = text.find("'" + token + "'"); at != std::string::npos)
+                text.replace(at + 1, token.size(), Cut(token));
+        }
+        // A number too large to hold is reported at its first character.
+        const std::uint64_t start = ex.id == 406 && position >= token.size() ? position - token.size() + 1 : position;
+        throw PlaceError{input_.Place(start), text};
     }
 
     bool StreamedFileSystems() const { return streamed_ != nullptr; }
 
 private:
+    struct Frame {
+        bool array;
+        std::string key; // the current key of an object
+        long next;       // the index the next element of an array gets
+    };
+
+    // The key path of `key` in the innermost object.
+    std::string PathTo(const std::string& key) const
+    {
+        std::string text;
+        for (std::size_t i = 0; i + 1 < frames_.size(); ++i) {
+            if (frames_[i].array) {
+                text += "[" + std::to_string(frames_[i].next - 1) + "]";
+            } else {
+                if (!text.empty())
+                    text += ".";
+                text += Cut(frames_[i].key);
+            }
+        }
+        return text.empty() ? Cut(key) : text + "." + Cut(key);
+    }
+
     template <typename V>
     bool Scalar(V&& v)
     {
@@ -748,6 +869,7 @@ private:
             return &root;
         }
         if (stack_.back()->is_array()) {
+            ++frames_.back().next;
             stack_.back()->push_back(std::move(v));
             return &stack_.back()->back();
         }
@@ -766,7 +888,9 @@ private:
     }
 
     State& state_;
+    const CheckedInput& input_;
     std::vector<json*> stack_;
+    std::vector<Frame> frames_;
     json* slot_ = nullptr;
     std::string topKey_;
     json* streamed_ = nullptr;
@@ -1055,15 +1179,15 @@ std::string UuidFromText(std::string_view text)
 
 namespace {
 
-// Reads a state from any input the JSON reader takes: a stream for files, which never
-// holds a whole large file in memory, or the built-in text, read in place.
-template <typename Input>
-State ParseInput(Input&& input, const std::string& source)
+// Reads a state from a stream, which never holds a whole large file in memory.
+State ParseStream(std::istream& in, const std::string& source)
 {
     State st;
     try {
-        StreamingReader reader(st);
-        json::sax_parse(std::forward<Input>(input), &reader, json::input_format_t::json, true, false);
+        CheckedInput checked(in.rdbuf());
+        std::istream input(&checked);
+        StreamingReader reader(st, checked);
+        json::sax_parse(input, &reader, json::input_format_t::json, true, false);
         if (!reader.root.is_object())
             throw PlaceError{"", std::string("expected a JSON object at the top level, found ") +
                                      reader.root.type_name()};
@@ -1085,7 +1209,7 @@ State ParseInput(Input&& input, const std::string& source)
 
 State Parse(std::istream& in, const std::string& source)
 {
-    return ParseInput(in, source);
+    return ParseStream(in, source);
 }
 
 State Demo()

@@ -183,6 +183,7 @@ TEST(HostJournal, TwentyProcessesAddingRulesAtOnceLoseNothing)
             try {
                 HostSim::OpenSession(host.StatePath());
                 StorageInfoImpl().AddNasFirewallConfig("10.1.0." + std::to_string(i), HostCtl::Storage::NFS_VERSION_3);
+                HostSim::SaveChanges();
             } catch (...) {
                 status = 1;
             }

@@ -254,6 +254,8 @@ TEST(HostState, DemoHostIsWrittenOnlyByTheFirstChange)
     const std::string demo = HostSim::DumpState();
 
     StorageInfoImpl().AddNasFirewallConfig("192.0.2.1", HostCtl::Storage::NFS_VERSION_3);
+    EXPECT_FALSE(Exists(host.StatePath())); // saved when the command ends
+    HostSim::SaveChanges();
     ASSERT_TRUE(Exists(host.StatePath()));
     nlohmann::json expected = nlohmann::json::parse(demo);
     expected["firewall"]["nfsClient"].push_back("192.0.2.1");

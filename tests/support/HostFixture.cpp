@@ -42,6 +42,7 @@ ScopedHost::~ScopedHost()
 
 nlohmann::json ScopedHost::State() const
 {
+    HostSim::SaveChanges(); // what a command would have saved when it ended
     std::ifstream in(statePath_, std::ios::binary);
     if (!in)
         return nullptr;
@@ -73,6 +74,7 @@ void ScopedHost::ClearJournal()
 
 void ScopedHost::Reopen()
 {
+    HostSim::SaveChanges();
     HostSim::CloseSession();
     HostSim::OpenSession(statePath_);
 }

@@ -22,7 +22,7 @@ public:
     const std::string& StatePath() const { return statePath_; }
     const std::string& JournalPath() const { return journalPath_; }
 
-    // The state file as it is on disk now (null when there is none).
+    // The state file as it is on disk after saving the session's changes (null when there is none).
     nlohmann::json State() const;
     // Every journal line so far, parsed.
     std::vector<nlohmann::json> Journal() const;
@@ -30,7 +30,7 @@ public:
     std::vector<std::string> JournalCalls() const;
     // Forgets the journal so far.
     void ClearJournal();
-    // Closes and reopens the session (fault counters restart, FeatureList is read again).
+    // Saves, closes and reopens the session (fault counters restart, FeatureList is read again).
     void Reopen();
 
 private:

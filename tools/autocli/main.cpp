@@ -1,21 +1,16 @@
 // autocli: opens the host session, builds the command tree from the plug-ins, then
-// parses, runs and prints one command.
+// parses, runs and prints one command, and saves what it changed.
 
-#include <dlfcn.h>
 #include <unistd.h>
 
-#include <algorithm>
 #include <cstdio>
-#include <cstdlib>
-#include <filesystem>
 #include <memory>
 #include <optional>
-#include <stdexcept>
 #include <string>
 #include <string_view>
-#include <system_error>
 #include <vector>
 
+#include "Plugins.h"
 #include "framework/Frontend.h"
 #include "host/HostSession.h"
 #include "hostctl/HostCtlException.h"
@@ -24,11 +19,9 @@
 
 namespace {
 
-namespace fs = std::filesystem;
 using Quillets::AutoCli::Namespace;
 using Quillets::AutoCli::NamespaceNode;
 using Quillets::Cli::DispatchHooks;
-using RegisterFunction = void (*)(std::shared_ptr<NamespaceNode>);
 
 std::optional<std::string> DescribeHostException(const std::exception_ptr& error)
 {
@@ -71,62 +64,67 @@ int Fail(const std::string& message)
     return Quillets::Cli::kExitException;
 }
 
-fs::path PluginDirectory()
+std::string Describe(const std::exception_ptr& error)
 {
-    if (const char* configured = std::getenv("AUTOCLI_PLUGIN_PATH"); configured && *configured) {
-        return configured;
-    }
-    std::error_code error;
-    const fs::path self = fs::read_symlink("/proc/self/exe", error);
-    if (error) {
-        return "lib/autocli/plugins";
-    }
-    return (self.parent_path() / ".." / "lib" / "autocli" / "plugins").lexically_normal();
+    return Quillets::Cli::DescribeException(error, Hooks());
 }
 
-// Loads every plug-in of the plug-in directory, in name order, and lets it register.
-// Returns "" on success, else the message that names what failed.
-std::string LoadPlugins(const std::shared_ptr<NamespaceNode>& root, const std::shared_ptr<NamespaceNode>& storage,
-                        const DispatchHooks& hooks)
+// A file name as one shell word.
+std::string ShellQuoted(const std::string& text)
 {
-    const fs::path directory = PluginDirectory();
-    std::vector<fs::path> plugins;
-    std::error_code error;
-    for (fs::directory_iterator it(directory, error), end; !error && it != end; it.increment(error)) {
-        if (it->path().extension() == ".so") {
-            plugins.push_back(it->path());
-        }
+    std::string quoted = "'";
+    for (char c : text) {
+        if (c == '\'')
+            quoted += "'\\''";
+        else
+            quoted += c;
     }
-    if (error) {
-        return "Cannot read the plug-in folder '" + directory.string() + "': " + error.message();
-    }
-    std::sort(plugins.begin(), plugins.end());
+    return quoted + "'";
+}
 
-    for (const auto& plugin : plugins) {
-        // Plug-ins stay loaded for the life of the process: the tree holds their objects.
-        void* handle = dlopen(plugin.c_str(), RTLD_NOW | RTLD_LOCAL);
-        if (handle == nullptr) {
-            const char* why = dlerror();
-            return "Cannot load plug-in '" + plugin.string() + "': " + (why ? why : "unknown error");
-        }
-        auto registerStorage = reinterpret_cast<RegisterFunction>(dlsym(handle, "FilesystemNfs_RegisterNamespaces"));
-        auto registerRoot = reinterpret_cast<RegisterFunction>(dlsym(handle, "AutoCli_RegisterNamespaces"));
-        if (registerStorage == nullptr && registerRoot == nullptr) {
-            return "Plug-in '" + plugin.string() + "' has no registration function.";
-        }
-        try {
-            if (registerStorage != nullptr) {
-                registerStorage(storage);
-            }
-            if (registerRoot != nullptr) {
-                registerRoot(root);
-            }
-        } catch (...) {
-            return "Plug-in '" + plugin.string() + "' failed to register: " +
-                   Quillets::Cli::DescribeException(std::current_exception(), hooks);
-        }
+int InitState(const std::string& path)
+{
+    try {
+        HostSim::InitState(path);
+    } catch (const HostSim::StateFileExists& e) {
+        Print(stderr, std::string(e.what()) + "\n");
+        return Quillets::Cli::kExitErrors;
+    } catch (...) {
+        return Fail(Describe(std::current_exception()));
     }
-    return {};
+    Print(stdout, "Created host state file '" + path + "' from the demo host.\n");
+    return Quillets::Cli::kExitOk;
+}
+
+// Runs the command line's invocation. In a dry run the host and shell calls are collected
+// instead of journaled or run, and listed after the command's own output.
+Quillets::Cli::CliOutcome RunCommandLine(const std::shared_ptr<NamespaceNode>& root,
+                                         const std::vector<std::string>& args, const DispatchHooks& hooks,
+                                         bool& saveAllowed)
+{
+    Quillets::Cli::Invocation invocation;
+    try {
+        invocation = Quillets::Cli::ParseCommandLine(root, args);
+    } catch (...) {
+        // Describing a command's input is the command's code, and may fail.
+        return {Quillets::Cli::kExitException, "", Describe(std::current_exception()) + "\n"};
+    }
+    const bool dryRun = invocation.globals.dryRun && invocation.action == Quillets::Cli::Invocation::Action::Run;
+    saveAllowed = !invocation.globals.dryRun;
+    if (!dryRun)
+        return Quillets::Cli::RunInvocation(invocation, hooks);
+
+    std::vector<std::string> calls;
+    auto collect = [&calls](const std::string& line) { calls.push_back(line); };
+    HostSim::SetJournalSink(collect);
+    Quillets::Cli::SetShellCommandSink(collect);
+    auto outcome = Quillets::Cli::RunInvocation(invocation, hooks);
+    HostSim::SetJournalSink({});
+    Quillets::Cli::SetShellCommandSink({});
+    outcome.err += "Dry run: nothing was saved.\n";
+    for (const auto& call : calls)
+        outcome.err += call + "\n";
+    return outcome;
 }
 
 // `tree` receives the command tree, so that it can outlive Run() (see main).
@@ -142,12 +140,32 @@ int Run(const std::vector<std::string>& args, std::shared_ptr<NamespaceNode>& tr
         Print(stdout, Quillets::Cli::VersionText());
         return Quillets::Cli::kExitOk;
     }
+    const auto state = HostSim::ChooseStatePath(leading.globals.statePath ? &*leading.globals.statePath : nullptr);
+    if (leading.globals.initState) {
+        if (leading.globals.dryRun) {
+            Print(stderr, "Options '--init-state' and '--dry-run' cannot be used together. See 'autocli --help'.\n");
+            return Quillets::Cli::kExitUsage;
+        }
+        return InitState(state.path);
+    }
+    const auto plugins = AutoCliFrontEnd::FindPluginFolder();
+    if (!plugins.error.empty()) {
+        Print(stderr, plugins.error + "\n");
+        return plugins.usageError ? Quillets::Cli::kExitUsage : Quillets::Cli::kExitException;
+    }
 
     // The session comes first: registration reads the host's feature switches.
     try {
-        HostSim::OpenSession(leading.globals.statePath ? *leading.globals.statePath : HostSim::DefaultStatePath());
+        HostSim::SessionOptions options;
+        options.mustExist = state.named;
+        options.dryRun = leading.globals.dryRun;
+        HostSim::OpenSession(state.path, options);
+    } catch (const HostSim::StateFileMissing& e) {
+        Print(stderr, std::string(e.what()) + " Create it from the demo host with: autocli --state " +
+                          ShellQuoted(state.path) + " --init-state\n");
+        return Quillets::Cli::kExitUsage;
     } catch (...) {
-        return Fail(Quillets::Cli::DescribeException(std::current_exception(), hooks));
+        return Fail(Describe(std::current_exception()));
     }
     if (leading.globals.dumpState) {
         Quillets::Cli::Invocation dump;
@@ -160,10 +178,27 @@ int Run(const std::vector<std::string>& args, std::shared_ptr<NamespaceNode>& tr
     auto storage = Namespace::New();
     storage->SetDescription("Manage storage on the Zephal host.");
     root->RegisterNamespaceNode(storage, "storage");
-    if (auto problem = LoadPlugins(root, storage, hooks); !problem.empty()) {
-        return Fail(problem);
+    const auto load = AutoCliFrontEnd::LoadPlugins(plugins.path, root, storage, Describe);
+    for (const auto& warning : load.warnings)
+        Print(stderr, warning + "\n");
+    if (!load.error.empty())
+        return Fail(load.error);
+
+    bool saveAllowed = true;
+    auto outcome = RunCommandLine(root, args, hooks, saveAllowed);
+    // The command's changes are saved once, whether it succeeded or not; its output follows.
+    std::string saveError;
+    if (saveAllowed) {
+        try {
+            HostSim::SaveChanges();
+        } catch (...) {
+            saveError = Describe(std::current_exception());
+        }
     }
-    return Finish(Quillets::Cli::Dispatch(root, args, hooks));
+    const int code = Finish(outcome);
+    if (!saveError.empty())
+        return Fail(saveError);
+    return code;
 }
 
 // With the sanitizers the process ends the ordinary way, so that their leak check sees
