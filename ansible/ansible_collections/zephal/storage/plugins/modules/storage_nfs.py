@@ -286,8 +286,11 @@ def main():
         cli.fail("NFS volume '%s' exists with other settings: %s. Set replace: true to remove it and add it again"
                  % (name, describe(found)), differences=found, diff=dict(before=before, after=dict(before, **wanted)))
 
-    after = dict(before or {}, **wanted)
-    after['mounted'] = True
+    if before is None or found:
+        # A volume added now is read-write unless asked otherwise; the rest is the host's default.
+        after = dict(wanted, read_only=bool(params['read_only']), mounted=True)
+    else:
+        after = dict(before, mounted=True)
     if before is None:
         cli.change(*add_arguments(params))
     elif found:
