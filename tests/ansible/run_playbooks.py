@@ -135,6 +135,12 @@ def scenario_docs(lab):
               output)
         for part in ('OPTIONS', 'EXAMPLES:', 'RETURN VALUES:', 'autocli_state'):
             check(part in done.stdout, 'ansible-doc for %s lacks %s' % (module, part), output)
+    # The options as documented are the options taken; Ansible itself only checks this in its own test tool.
+    with open(shutil.which('ansible-doc')) as f:
+        python = f.readline()[2:].split()
+    done = subprocess.run(python + [os.path.join(lab.source, 'tests', 'ansible', 'doc_matches_options.py'),
+                                    os.path.join(lab.source, 'ansible')], capture_output=True, text=True, env=lab.env)
+    check(done.returncode == 0, 'documentation and options differ', done.stdout + done.stderr)
     done = subprocess.run(['ansible-doc', '-l', 'zephal.storage'], capture_output=True, text=True, env=lab.env,
                           cwd=lab.work)
     listed = sorted(line.split()[0] for line in done.stdout.splitlines() if line.strip())
