@@ -233,6 +233,7 @@ def main():
         if shutil.which(tool) is None:
             skip('%s is not installed (Debian package ansible-core; scripts/bootstrap installs it)' % tool)
     work = tempfile.mkdtemp(prefix='ansible-' + name + '-')
+    keep = False
     try:
         lab = Lab(autocli, source, work)
         if name != 'docs':
@@ -243,10 +244,13 @@ def main():
                 skip('this autocli has no dry run (--dry-run), which check mode runs on')
         SCENARIOS[name](lab)
     except Failure as failure:
+        keep = True
         print('FAILED: %s' % failure)
         print('(work folder kept: %s)' % work)
         return 1
-    shutil.rmtree(work)
+    finally:
+        if not keep:
+            shutil.rmtree(work)
     print('passed: ' + name)
     return 0
 
