@@ -27,6 +27,7 @@ options:
       - The host back end autocli talks to (its C(--host) option), for example C(sim) or C(linux).
       - When the task does not set it, the host's inventory variable C(autocli_host) is used;
         when neither is set, the option is not passed and autocli chooses.
+      - A host that is not simulated has no state file; leave C(autocli_state) unset for it.
     type: str
 notes:
   - Every change is made by running autocli on the managed host; in check mode the same commands
