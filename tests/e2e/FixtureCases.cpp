@@ -70,17 +70,21 @@ TEST_P(FixtureCaseTest, MatchesExpectedOutput)
     ASSERT_FALSE(fixture.steps.empty()) << file << ": no '== run:' step";
 
     TempDir dir;
-    const fs::path state = dir.Path() / "host.json";
     const fs::path journal = dir.Path() / "journal.jsonl";
+    // A case with a state names its file; one without runs at the default path, inside the
+    // case's folder, where the demo host is used until a change writes it.
+    std::string state;
     if (fixture.state) {
+        state = (dir.Path() / "host.json").string();
         std::ofstream(state) << *fixture.state;
     }
-    std::vector<std::string> env = fixture.env;
+    std::vector<std::string> env{"XDG_STATE_HOME=" + (dir.Path() / "xdg").string(), "AUTOCLI_STATE="};
+    env.insert(env.end(), fixture.env.begin(), fixture.env.end());
     env.push_back("AUTOCLI_JOURNAL=" + journal.string());
 
     for (const auto& step : fixture.steps) {
         SCOPED_TRACE(file.string() + ": autocli " + step.commandLine);
-        const auto result = TestSupport::RunAutocli(step.args, state.string(), env);
+        const auto result = TestSupport::RunAutocli(step.args, state, env);
         EXPECT_EQ(result.out, step.expectedStdout);
         EXPECT_EQ(result.err, step.expectedStderr);
         EXPECT_EQ(result.exitCode, step.expectedExit);

@@ -23,6 +23,7 @@
 
 namespace {
 
+using namespace std::string_literals;
 using HostCtl::Lib::HostCtlException;
 using KnxCtl::Storage::StorageInfoImpl;
 using TestSupport::ScopedHost;
@@ -53,8 +54,8 @@ std::string MessageOf(const std::function<void()>& call)
 
 struct BadState {
     const char* name;
-    const char* text;
-    const char* place; // must appear in the message after the file name
+    std::string text;
+    std::string place; // must appear in the message after the file name
 };
 
 // Test listings name a case by its name rather than by its bytes.
@@ -87,6 +88,28 @@ const BadState kBadStates[] = {
      "fileSystems[0].users[0].macAddress: expected a MAC address"},
     {"pendingWrongType", R"({"pendingRescan": {"fileSystems": {}}})",
      "pendingRescan.fileSystems: expected an array, found object"},
+    // Whatever follows the document is refused, a NUL byte (which the JSON reader takes for
+    // the end) included, so nothing is silently dropped at the next save.
+    {"nulAfterDocument", "{\"features\": {}}\n\0{\"faults\": []}"s, "line 2, column 1: a NUL byte is not allowed"},
+    {"nulInsideDocument", "{\"features\":\0 {}}"s, "line 1, column 13: a NUL byte is not allowed"},
+    // A repeated key is refused at any depth, whatever the type of its second value.
+    {"repeatedFileSystems", R"({"fileSystems": [{"type": "HLFS", "volumeName": "a"}], "fileSystems": {}})",
+     "fileSystems: this key is given twice"},
+    {"repeatedFileSystemsArray", R"({"fileSystems": [], "fileSystems": [{"type": "HLFS", "volumeName": "a"}]})",
+     "fileSystems: this key is given twice"},
+    {"repeatedNestedKey", R"({"fileSystems": [{"type": "HLFS", "volumeName": "a"}, {"type": "NFS", "type": "HLFS"}]})",
+     "fileSystems[1].type: this key is given twice"},
+    {"repeatedKeyInArrayOfObjects", R"({"heaps": [{"name": "a"}, {"name": "b", "size": 1, "size": 2}]})",
+     "heaps[1].size: this key is given twice"},
+    {"numberTooLarge", "{\n  \"heaps\": [{\"size\": 1e400}]}", "line 2, column 22: number overflow parsing '1e400'"},
+    {"integerTooLarge", R"({"heaps": [{"size": 18446744073709551616}]})",
+     "heaps[0].size: expected an unsigned integer, found number"},
+    // Long texts are cut: neither a huge key nor a huge token makes a huge message.
+    {"longKeyIsCut", "{\"" + std::string(100000, 'k') + "\": 1}", std::string(80, 'k') + "...: unknown key"},
+    {"longTokenIsCut", "{\"a\": \"" + std::string(100000, 'x'), "last read: '\"" + std::string(79, 'x') + "...'"},
+    {"longMacIsCut", R"({"fileSystems": [{"type": "HLFS", "volumeName": "a", "users": [{"macAddress": ")" +
+                         std::string(100000, 'm') + "\"}]}]}",
+     "found '" + std::string(80, 'm') + "...'"},
 };
 
 class BadStateTest : public ::testing::TestWithParam<BadState> {};
@@ -99,6 +122,7 @@ TEST_P(BadStateTest, EveryCallFailsWithTheMessageAndTheFileIsKept)
 
     const std::string message = MessageOf([] { StorageInfoImpl info; });
     EXPECT_EQ(message.rfind("Invalid host state file '" + host.StatePath() + "': ", 0), 0u) << message;
+    EXPECT_LT(message.size(), 400u) << message.substr(0, 1000);
     EXPECT_NE(message.find(bad.place), std::string::npos) << message;
 
     const std::function<void()> calls[] = {
@@ -329,15 +353,19 @@ TEST(HostState, ChangesAreSeenByTheNextSessionAndByOtherObjects)
 TEST(HostState, DefaultStatePathFollowsTheEnvironment)
 {
     struct Case {
+        const char* option; // --state
         const char* state;
         const char* xdg;
         const char* home;
         std::string expected;
+        bool named; // then the file must exist
     };
     const Case cases[] = {
-        {"/s/host.json", "/x", "/h", "/s/host.json"},
-        {nullptr, "/x", "/h", "/x/autocli/host.json"},
-        {"", "", "/h", "/h/.local/state/autocli/host.json"},
+        {nullptr, "/s/host.json", "/x", "/h", "/s/host.json", true},
+        {nullptr, nullptr, "/x", "/h", "/x/autocli/host.json", false},
+        {nullptr, "", "", "/h", "/h/.local/state/autocli/host.json", false},
+        {"o.json", "/s/host.json", "/x", "/h", "o.json", true},
+        {"o.json", nullptr, nullptr, "/h", "o.json", true},
     };
     auto set = [](const char* name, const char* value) {
         if (value)
@@ -350,29 +378,17 @@ TEST(HostState, DefaultStatePathFollowsTheEnvironment)
         set("AUTOCLI_STATE", c.state);
         set("XDG_STATE_HOME", c.xdg);
         set("HOME", c.home);
-        EXPECT_EQ(HostSim::DefaultStatePath(), c.expected);
+        const std::string option = c.option ? c.option : "";
+        const auto choice = HostSim::ChooseStatePath(c.option ? &option : nullptr);
+        EXPECT_EQ(choice.path, c.expected);
+        EXPECT_EQ(choice.named, c.named) << c.expected;
+        if (!c.option) {
+            EXPECT_EQ(HostSim::DefaultStatePath(), c.expected);
+        }
     }
     ::unsetenv("AUTOCLI_STATE");
     ::unsetenv("XDG_STATE_HOME");
     ::setenv("HOME", savedHome.c_str(), 1);
-}
-
-TEST(HostState, SessionWaitsForTheLockAndThenGivesUp)
-{
-    ScopedHost host("{}");
-    HostSim::CloseSession();
-    int fd = ::open((host.StatePath() + ".lock").c_str(), O_RDWR);
-    ASSERT_GE(fd, 0);
-    ASSERT_EQ(::flock(fd, LOCK_EX), 0);
-    try {
-        HostSim::OpenSession(host.StatePath());
-        ADD_FAILURE() << "the session opened although the lock was held";
-    } catch (const std::runtime_error& e) {
-        EXPECT_NE(std::string(e.what()).find("is in use by another process"), std::string::npos) << e.what();
-    }
-    ::close(fd);
-    HostSim::OpenSession(host.StatePath());
-    EXPECT_NO_THROW(StorageInfoImpl());
 }
 
 } // namespace

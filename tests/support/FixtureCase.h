@@ -18,7 +18,8 @@ struct FixtureStep {
 
 // A fixture case file:
 //   # comments (only before the first section)
-//   == state            the state file (absent: no file, so the demo host)
+//   == state            the state file, named with --state (absent: the default path, with
+//                       no file there, so the demo host until a change writes it)
 //   == env NAME=VALUE   an extra environment entry for every run
 //   == run: ARGS        a run, ARGS split as a POSIX shell would
 //   == stdout / == stderr   the exact expected text (absent: empty)

@@ -1,0 +1,219 @@
+// Where autocli takes code from. It runs as root, so a plug-in that someone else could have
+// changed, or a library that is not a plug-in, is skipped with a warning naming it, and the
+// others still load.
+
+#include <fcntl.h>
+#include <pwd.h>
+#include <spawn.h>
+#include <sys/stat.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <filesystem>
+#include <fstream>
+#include <functional>
+#include <string>
+#include <vector>
+
+#include <gtest/gtest.h>
+
+#include "support/Cli.h"
+
+namespace {
+
+namespace fs = std::filesystem;
+using TestSupport::RunAutocli;
+
+class Folder {
+public:
+    Folder()
+    {
+        std::string pattern = (fs::temp_directory_path() / "plugins-XXXXXX").string();
+        if (!::mkdtemp(pattern.data()))
+            throw std::runtime_error("mkdtemp failed");
+        path_ = pattern;
+        ::chmod(path_.c_str(), 0755);
+    }
+    ~Folder()
+    {
+        std::error_code ignored;
+        fs::remove_all(path_, ignored);
+    }
+    std::string operator/(const std::string& name) const { return path_ + "/" + name; }
+
+private:
+    std::string path_;
+};
+
+// A shared library that is no storage plug-in: the one the simulated host is built into
+// would register nothing either, but a plain system library is the likelier stray file.
+std::string StrayLibrary()
+{
+    for (const char* candidate : {"/usr/lib/x86_64-linux-gnu/libz.so.1", "/lib/x86_64-linux-gnu/libz.so.1",
+                                  "/usr/lib/aarch64-linux-gnu/libz.so.1", "/usr/lib/libz.so.1"})
+        if (fs::exists(candidate))
+            return candidate;
+    return {};
+}
+
+void Plugin(const std::string& path, mode_t mode = 0644)
+{
+    fs::create_directories(fs::path(path).parent_path());
+    fs::copy_file(STORAGECLI_PLUGIN, path, fs::copy_options::overwrite_existing);
+    ::chmod(path.c_str(), mode);
+}
+
+uid_t NobodyUid()
+{
+    const passwd* pw = ::getpwnam("nobody");
+    return pw ? pw->pw_uid : 65534;
+}
+
+struct LoadCase {
+    const char* name;
+    // Prepares the folder; returns the value of AUTOCLI_PLUGIN_PATH.
+    std::function<std::string(const Folder&)> setUp;
+    int exitCode;
+    bool listed; // the command ran and printed its table
+    std::function<std::string(const Folder&)> err;
+};
+
+void PrintTo(const LoadCase& c, std::ostream* os) { *os << c.name; }
+
+class PluginLoadingTest : public ::testing::TestWithParam<LoadCase> {};
+
+TEST_P(PluginLoadingTest, UntrustedOrStrayLibrariesAreSkipped)
+{
+    const LoadCase& c = GetParam();
+    if (::geteuid() != 0)
+        GTEST_SKIP() << "needs root to give files to another user";
+    if (StrayLibrary().empty())
+        GTEST_SKIP() << "no plain shared library found to stand for a stray file";
+    Folder folder;
+    const std::string plugins = c.setUp(folder);
+    const auto run = RunAutocli({"storage", "filesystem", "list"}, "",
+                                {"AUTOCLI_PLUGIN_PATH=" + plugins, "XDG_STATE_HOME=" + (folder / "xdg"), "AUTOCLI_STATE="});
+    EXPECT_EQ(run.exitCode, c.exitCode) << run.err;
+    EXPECT_EQ(run.out.find("datastore1") != std::string::npos, c.listed) << run.out;
+    EXPECT_EQ(run.err, c.err(folder));
+}
+
+const std::string kWritable = "it can be written by users other than its owner";
+
+const LoadCase kLoadCases[] = {
+    {"relativeFolder", [](const Folder&) { return std::string("lib/autocli/plugins"); }, 2, false,
+     [](const Folder&) {
+         return std::string("AUTOCLI_PLUGIN_PATH must name an absolute folder, not 'lib/autocli/plugins'.\n");
+     }},
+    {"strayLibraryBesideThePlugin",
+     [](const Folder& f) {
+         Plugin(f / "p/storage.so");
+         fs::copy_file(StrayLibrary(), f / "p/notes.so");
+         return f / "p";
+     },
+     0, true,
+     [](const Folder& f) {
+         return "Skipping '" + (f / "p/notes.so") +
+                "': it is not a storage plug-in (it exports no registration function).\n";
+     }},
+    {"worldWritablePlugin",
+     [](const Folder& f) {
+         Plugin(f / "p/a.so", 0666);
+         Plugin(f / "p/b.so");
+         return f / "p";
+     },
+     0, true, [](const Folder& f) { return "Skipping plug-in '" + (f / "p/a.so") + "': " + kWritable + ".\n"; }},
+    {"anotherUsersPlugin",
+     [](const Folder& f) {
+         Plugin(f / "p/a.so");
+         ::chown((f / "p/a.so").c_str(), NobodyUid(), 0);
+         return f / "p";
+     },
+     3, false,
+     [](const Folder& f) {
+         return "Skipping plug-in '" + (f / "p/a.so") + "': it is owned by user " + std::to_string(NobodyUid()) +
+                ", neither root nor the caller.\nNo plug-in could be loaded from '" + (f / "p") + "'.\n";
+     }},
+    {"groupWritableFolder",
+     [](const Folder& f) {
+         Plugin(f / "p/a.so");
+         ::chmod((f / "p").c_str(), 0775);
+         return f / "p";
+     },
+     3, false,
+     [](const Folder& f) {
+         return "Skipping the plug-in folder '" + (f / "p") + "': '" + (f / "p") + "': " + kWritable +
+                ".\nNo plug-in could be loaded from '" + (f / "p") + "'.\n";
+     }},
+    {"worldWritableFolderAbove",
+     [](const Folder& f) {
+         Plugin(f / "open/p/a.so");
+         ::chmod((f / "open").c_str(), 0777);
+         return f / "open/p";
+     },
+     3, false,
+     [](const Folder& f) {
+         return "Skipping the plug-in folder '" + (f / "open/p") + "': '" + (f / "open") + "': " + kWritable +
+                ".\nNo plug-in could be loaded from '" + (f / "open/p") + "'.\n";
+     }},
+    {"linkIntoAnOpenFolder",
+     [](const Folder& f) {
+         Plugin(f / "open/a.so");
+         ::chmod((f / "open").c_str(), 0777);
+         fs::create_directories(f / "p");
+         fs::create_symlink(f / "open/a.so", f / "p/a.so");
+         Plugin(f / "p/b.so");
+         return f / "p";
+     },
+     0, true,
+     [](const Folder& f) { return "Skipping plug-in '" + (f / "p/a.so") + "': '" + (f / "open") + "': " + kWritable + ".\n"; }},
+};
+
+INSTANTIATE_TEST_SUITE_P(Loading, PluginLoadingTest, ::testing::ValuesIn(kLoadCases),
+                         [](const auto& info) { return std::string(info.param.name); });
+
+// Without /proc and started by a relative name, autocli cannot know where it lives: it
+// refuses rather than look in the current folder, where anyone's files may be.
+TEST(PluginFolder, NeverTheCurrentFolder)
+{
+    if (::geteuid() != 0 || !fs::exists("/usr/bin/unshare"))
+        GTEST_SKIP() << "needs root and unshare for a private mount namespace without /proc";
+    Folder folder;
+    Plugin(folder / "lib/autocli/plugins/a.so");
+    fs::copy_file(AUTOCLI_BINARY, folder / "autocli");
+    const std::string libraries = fs::path(STORAGECLI_PLUGIN).parent_path().parent_path().parent_path().string();
+    const std::string script = "mount -t tmpfs none /proc || exit 99; cd \"$1\" && ./autocli storage filesystem list";
+    const std::vector<std::string> args{"/usr/bin/unshare", "-m", "--propagation", "private", "/bin/sh", "-c",
+                                        script, "sh", folder / ""};
+    std::vector<char*> argv;
+    for (const auto& arg : args)
+        argv.push_back(const_cast<char*>(arg.c_str()));
+    argv.push_back(nullptr);
+    const std::string out = folder / "out", err = folder / "err";
+    posix_spawn_file_actions_t actions;
+    posix_spawn_file_actions_init(&actions);
+    posix_spawn_file_actions_addopen(&actions, STDOUT_FILENO, out.c_str(), O_WRONLY | O_CREAT | O_TRUNC, 0600);
+    posix_spawn_file_actions_addopen(&actions, STDERR_FILENO, err.c_str(), O_WRONLY | O_CREAT | O_TRUNC, 0600);
+    std::vector<std::string> env{"PATH=/usr/sbin:/usr/bin:/sbin:/bin", "LD_LIBRARY_PATH=" + libraries,
+                                 "XDG_STATE_HOME=" + (folder / "xdg")};
+    std::vector<char*> envp;
+    for (auto& entry : env)
+        envp.push_back(entry.data());
+    envp.push_back(nullptr);
+    pid_t pid = -1;
+    ASSERT_EQ(posix_spawn(&pid, argv[0], &actions, nullptr, argv.data(), envp.data()), 0);
+    posix_spawn_file_actions_destroy(&actions);
+    int status = 0;
+    ::waitpid(pid, &status, 0);
+    if (WIFEXITED(status) && WEXITSTATUS(status) == 99)
+        GTEST_SKIP() << "cannot mount in a private namespace here";
+    EXPECT_TRUE(WIFEXITED(status) && WEXITSTATUS(status) == 3);
+    std::ifstream errText(err);
+    std::string line;
+    std::getline(errText, line);
+    EXPECT_EQ(line, "Cannot find the plug-in folder: the path of the running program is not known "
+                    "(set AUTOCLI_PLUGIN_PATH to an absolute folder).");
+    EXPECT_EQ(fs::file_size(out), 0u);
+}
+
+} // namespace
