@@ -3,17 +3,18 @@
 #include <algorithm>
 #include <cerrno>
 #include <chrono>
+#include <cstdio>
 #include <cstdlib>
 #include <cstring>
-#include <cstdio>
 #include <functional>
 #include <istream>
+#include <optional>
 #include <ostream>
-#include <utility>
 #include <sstream>
 #include <stdexcept>
 #include <thread>
 #include <unordered_map>
+#include <utility>
 #include <vector>
 
 #include <dirent.h>

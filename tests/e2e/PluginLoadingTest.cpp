@@ -18,32 +18,14 @@
 #include <gtest/gtest.h>
 
 #include "support/Cli.h"
+#include "support/TempFolder.h"
 
 namespace {
 
 namespace fs = std::filesystem;
 using TestSupport::RunAutocli;
 
-class Folder {
-public:
-    Folder()
-    {
-        std::string pattern = (fs::temp_directory_path() / "plugins-XXXXXX").string();
-        if (!::mkdtemp(pattern.data()))
-            throw std::runtime_error("mkdtemp failed");
-        path_ = pattern;
-        ::chmod(path_.c_str(), 0755);
-    }
-    ~Folder()
-    {
-        std::error_code ignored;
-        fs::remove_all(path_, ignored);
-    }
-    std::string operator/(const std::string& name) const { return path_ + "/" + name; }
-
-private:
-    std::string path_;
-};
+using Folder = TestSupport::TempFolder;
 
 // A shared library that is no storage plug-in: the one the simulated host is built into
 // would register nothing either, but a plain system library is the likelier stray file.

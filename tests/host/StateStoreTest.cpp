@@ -33,6 +33,7 @@
 #include "hostctl/HostCtlException.h"
 #include "hostctl/StorageInfoImpl.h"
 #include "support/Cli.h"
+#include "support/TempFolder.h"
 
 extern char** environ;
 
@@ -43,32 +44,15 @@ using KnxCtl::Storage::StorageInfoImpl;
 using TestSupport::CliResult;
 using TestSupport::RunAutocli;
 
-class Folder {
+// A test's folder; runs without --state use the default path inside it.
+class Folder : public TestSupport::TempFolder {
 public:
-    // `base` holds the folder; the tests that save hundreds of times use memory-backed
-    // /dev/shm where there is one, since they check what is written, not the disk.
-    explicit Folder(const fs::path& base = fs::temp_directory_path())
-    {
-        std::string pattern = (base / "state-store-XXXXXX").string();
-        if (!::mkdtemp(pattern.data()))
-            throw std::runtime_error("mkdtemp failed");
-        path_ = pattern;
-        ::chmod(path_.c_str(), 0755);
-    }
-    ~Folder()
-    {
-        std::error_code ignored;
-        fs::remove_all(path_, ignored);
-    }
-    std::string operator/(const std::string& name) const { return path_ + "/" + name; }
-    const std::string& Path() const { return path_; }
-    // Runs without --state use the default path, here inside this folder.
-    std::vector<std::string> Env() const { return {"XDG_STATE_HOME=" + path_ + "/xdg", "AUTOCLI_STATE="}; }
-
-private:
-    std::string path_;
+    using TempFolder::TempFolder;
+    std::vector<std::string> Env() const { return {"XDG_STATE_HOME=" + Path() + "/xdg", "AUTOCLI_STATE="}; }
 };
 
+// The tests that save hundreds of times use memory-backed /dev/shm where there is one, since
+// they check what is written, not the disk.
 fs::path MemoryBacked()
 {
     std::error_code error;
