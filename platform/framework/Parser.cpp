@@ -275,7 +275,7 @@ private:
     std::string Apply(const ParameterSpec& parameter, const std::vector<std::string>& args, std::size_t& i,
                       const std::optional<std::string>& inlineValue)
     {
-        const std::string name = parameter.GetName();
+        const std::string& name = parameter.GetName();
         const std::string shown = "'--" + name + "'";
         const bool repeated = given_.count(name) != 0;
         if (repeated && parameter.GetType() != ParameterType::StringList) {

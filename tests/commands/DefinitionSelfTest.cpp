@@ -107,7 +107,8 @@ std::vector<std::string> Problems(Command& command)
             if (constraint->GetType() == ParameterConstraintType::StringEnum && constraint->GetStringEnum().empty()) {
                 problems.push_back("'" + name + "' has an empty enumeration");
             }
-            if (constraint->GetType() == ParameterConstraintType::IntRange && constraint->GetMin() > constraint->GetMax()) {
+            if (constraint->GetType() == ParameterConstraintType::IntRange &&
+                constraint->GetMin() > constraint->GetMax()) {
                 problems.push_back("'" + name + "' has an empty integer range");
             }
         }

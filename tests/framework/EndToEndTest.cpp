@@ -30,7 +30,7 @@ protected:
 
     std::string State(const std::string& json)
     {
-        const auto path = (dir_ / "host.json").string();
+        auto path = (dir_ / "host.json").string();
         std::ofstream(path) << json;
         return path;
     }

@@ -121,8 +121,6 @@ TEST_P(UsageErrors, NameTheProblemAndPointToHelp)
     EXPECT_EQ(tree.set->executions, 0);
 }
 
-const char* const kSetHelp = " See 'autocli storage volume set --help'.";
-
 INSTANTIATE_TEST_SUITE_P(
     EachClass, UsageErrors,
     ::testing::Values(
