@@ -15,6 +15,7 @@
 #include <gtest/gtest.h>
 #include <nlohmann/json.hpp>
 
+#include "framework/TreeWalk.h"
 #include "host/HostState.h"
 #include "quillets/QuilletException.h"
 #include "registration/Registration.h"
@@ -46,9 +47,9 @@ void Collect(const std::shared_ptr<NamespaceNode>& node, const std::string& path
     }
 }
 
-std::vector<Definition> RegisteredTree()
+std::vector<Definition> RegisteredTree(std::shared_ptr<NamespaceNode>& root)
 {
-    auto root = Namespace::New();
+    root = Namespace::New();
     root->SetName("root");
     auto storage = Namespace::New();
     storage->SetDescription("Manage storage.");
@@ -187,7 +188,8 @@ std::set<std::string> CommandPaths(const std::string& state)
     TestSupport::ScopedHost host(state);
     std::set<std::string> paths;
     std::set<const NamespaceNode*> nodes;
-    for (const auto& [path, node] : RegisteredTree()) {
+    std::shared_ptr<NamespaceNode> root;
+    for (const auto& [path, node] : RegisteredTree(root)) {
         SCOPED_TRACE(state + ": " + path);
         EXPECT_TRUE(nodes.insert(node.get()).second) << "one node object registered at two places";
         if (auto command = std::dynamic_pointer_cast<Command>(node)) {
@@ -201,6 +203,12 @@ std::set<std::string> CommandPaths(const std::string& state)
             EXPECT_FALSE(node->GetDescription().empty()) << "namespace without description";
         }
     }
+    // The list the front end shows (--help, the command list) holds the same commands.
+    std::set<std::string> listed;
+    for (const auto& entry : Quillets::Cli::ListCommands(root)) {
+        listed.insert(Quillets::Cli::JoinPath(entry.path));
+    }
+    EXPECT_EQ(listed, paths) << state;
     return paths;
 }
 
