@@ -224,8 +224,9 @@ std::shared_ptr<OutputSpec> NFSVolumeParamSet::GetOutputSpecInternal() { return 
 void NFSVolumeParamSet::ExecuteInternal(const InputPtr& in, const OutputPtr& out)
 {
     const V3ParamFeatures features;
-    const std::string& knxnic = in->GetParameter(kKnxnic);
-    const bool setKnxnic = features.knxnic && IsGiven(knxnic);
+    // The knxnic parameter exists only while its feature switch is on.
+    const std::string knxnic = features.knxnic ? in->GetParameter(kKnxnic) : std::string();
+    const bool setKnxnic = IsGiven(knxnic);
     const bool setConnections = features.connections && in->HasParameter(kConnections);
     SetVolumeParams(in->GetParameter(kOptionVolumeName), NonPEV3Volumes, "NAS", out,
                     [&](NetworkFileSystem& volume) {

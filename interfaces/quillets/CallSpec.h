@@ -81,11 +81,18 @@ private:
     std::shared_ptr<MetaObj::MetaObject> root_;
 };
 
-// The parsed arguments of one call. A parameter that was not given reads as
-// the empty string, 0, false or an empty list.
+// The parsed arguments of one call. A declared parameter that was not given reads as
+// the empty string, 0, false or an empty list. Once the input knows what its command
+// declared (Declare), reading a name the command did not declare, or reading a parameter
+// as another type than declared, throws QuilletException: a misspelt name is a fault in
+// the command, never an absent value.
 class Input {
 public:
     static std::shared_ptr<Input> New();
+
+    // `command` names the command in messages. The framework declares every input it parses.
+    void Declare(std::shared_ptr<const InputSpec> inputs, const std::string& command);
+    bool IsDeclared() const { return declared_ != nullptr; }
 
     bool HasParameter(const std::string& name) const;
     const std::string& GetParameter(const std::string& name) const;
@@ -102,6 +109,12 @@ public:
     void AddParameterListValue(const std::string& name, const std::string& value);
 
 private:
+    // Throws unless `name` is declared with one of the types in `types` (a bit per ParameterType).
+    void CheckRead(const std::string& name, unsigned types, const char* readAs) const;
+    bool ReadBool(const std::string& name) const;
+
+    std::shared_ptr<const InputSpec> declared_;
+    std::string command_;
     std::map<std::string, std::string> strings_;
     std::map<std::string, std::int64_t> ints_;
     std::map<std::string, bool> bools_;

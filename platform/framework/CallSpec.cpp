@@ -64,30 +64,99 @@ auto Lookup(const Map& map, const std::string& name, const typename Map::mapped_
 }
 } // namespace
 
+void Input::Declare(std::shared_ptr<const InputSpec> inputs, const std::string& command)
+{
+    if (!inputs) {
+        throw QuilletException("An input must be declared with a parameter description");
+    }
+    declared_ = std::move(inputs);
+    command_ = command;
+}
+
+namespace {
+
+constexpr unsigned Bit(ParameterType type) { return 1U << static_cast<unsigned>(type); }
+constexpr unsigned kAnyType = ~0U;
+
+const char* TypeName(ParameterType type)
+{
+    switch (type) {
+    case ParameterType::String:
+        return "a string";
+    case ParameterType::Int:
+        return "an integer";
+    case ParameterType::Bool:
+        return "a boolean";
+    case ParameterType::Flag:
+        return "a flag";
+    case ParameterType::StringList:
+        return "a string list";
+    }
+    return "an unknown type";
+}
+
+} // namespace
+
+void Input::CheckRead(const std::string& name, unsigned types, const char* readAs) const
+{
+    if (!declared_) {
+        return;
+    }
+    const std::string who = command_.empty() ? std::string("A command") : "Command '" + command_ + "'";
+    for (const auto& parameter : declared_->GetParameters()) {
+        if (!parameter || parameter->GetName() != name) {
+            continue;
+        }
+        if ((types & Bit(parameter->GetType())) == 0) {
+            throw QuilletException(who + " reads parameter '" + name + "' as " + readAs + ", but declares it as " +
+                                   TypeName(parameter->GetType()) + ".");
+        }
+        return;
+    }
+    throw QuilletException(who + " reads parameter '" + name + "', which it does not declare.");
+}
+
 bool Input::HasParameter(const std::string& name) const
 {
+    CheckRead(name, kAnyType, "");
     return strings_.count(name) != 0 || ints_.count(name) != 0 || bools_.count(name) != 0 || lists_.count(name) != 0;
 }
 
-const std::string& Input::GetParameter(const std::string& name) const { return Lookup(strings_, name, kEmpty); }
+const std::string& Input::GetParameter(const std::string& name) const
+{
+    CheckRead(name, Bit(ParameterType::String), TypeName(ParameterType::String));
+    return Lookup(strings_, name, kEmpty);
+}
 
 std::int64_t Input::GetParameterInt(const std::string& name) const
 {
+    CheckRead(name, Bit(ParameterType::Int), TypeName(ParameterType::Int));
     auto found = ints_.find(name);
     return found == ints_.end() ? 0 : found->second;
 }
 
 bool Input::GetParameterBool(const std::string& name) const
 {
+    CheckRead(name, Bit(ParameterType::Bool) | Bit(ParameterType::Flag), TypeName(ParameterType::Bool));
+    return ReadBool(name);
+}
+
+bool Input::ReadBool(const std::string& name) const
+{
     auto found = bools_.find(name);
     return found != bools_.end() && found->second;
 }
 
 // Flags are kept with the booleans: a flag is a boolean that is only ever set to true.
-bool Input::IsFlagSet(const std::string& name) const { return GetParameterBool(name); }
+bool Input::IsFlagSet(const std::string& name) const
+{
+    CheckRead(name, Bit(ParameterType::Flag), TypeName(ParameterType::Flag));
+    return ReadBool(name);
+}
 
 void Input::GetParameterList(const std::string& name, std::vector<std::string>& values) const
 {
+    CheckRead(name, Bit(ParameterType::StringList), TypeName(ParameterType::StringList));
     values.clear();
     auto found = lists_.find(name);
     if (found != lists_.end()) {

@@ -77,7 +77,8 @@ std::pair<const std::string*, Entry*> Intern(const std::string& text)
 
 } // namespace
 
-std::shared_ptr<MetaStruct> MetaStruct::New(std::string structureName)
+// The parameter's type is the published interface's.
+std::shared_ptr<MetaStruct> MetaStruct::New(std::string structureName) // NOLINT(performance-unnecessary-value-param)
 {
     auto object = std::make_shared<MetaStruct>();
     std::tie(object->name_, object->entry_) = Intern<NameEntry>(structureName);

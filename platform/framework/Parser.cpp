@@ -335,7 +335,7 @@ private:
     std::string Apply(const ParameterSpec& parameter, const std::vector<std::string>& args, std::size_t& i,
                       const std::optional<std::string>& inlineValue)
     {
-        const std::string name = parameter.GetName();
+        const std::string& name = parameter.GetName();
         const std::string shown = "'--" + name + "'";
         const bool repeated = given_.count(name) != 0;
         if (repeated && parameter.GetType() != ParameterType::StringList) {
@@ -434,30 +434,37 @@ std::string HelpHint(const CommandPath& path)
     return path.empty() ? std::string(" See 'autocli --help'.") : " See 'autocli " + JoinPath(path) + " --help'.";
 }
 
+// Reads the global options before the path into the reader's options; returns the index of
+// the first argument after them and sets `error` on a usage error.
+std::size_t ReadLeadingGlobals(GlobalReader& reader, const GlobalOptions& globals, const std::vector<std::string>& args,
+                               std::string& error)
+{
+    std::size_t i = 0;
+    for (; i < args.size() && IsOption(args[i]); ++i) {
+        const auto match = reader.Read(args, i, true, error);
+        if (match == Match::Failed) {
+            error += HelpHint({});
+            break;
+        }
+        if (match == Match::NotMine) {
+            error = "Unknown option " + Quote(args[i]) + "." + GlobalSuggestion(args[i], true) + HelpHint({});
+            break;
+        }
+        if (globals.help) {
+            ++i;
+            break;
+        }
+    }
+    return i;
+}
+
 } // namespace
 
 LeadingGlobals ParseLeadingGlobals(const std::vector<std::string>& args)
 {
     LeadingGlobals result;
     GlobalReader reader(result.globals);
-    std::size_t i = 0;
-    for (; i < args.size() && IsOption(args[i]); ++i) {
-        std::string error;
-        const auto match = reader.Read(args, i, true, error);
-        if (match == Match::Failed) {
-            result.error = error + HelpHint({});
-            break;
-        }
-        if (match == Match::NotMine) {
-            result.error = "Unknown option " + Quote(args[i]) + "." + GlobalSuggestion(args[i], true) + HelpHint({});
-            break;
-        }
-        if (result.globals.help) {
-            ++i;
-            break;
-        }
-    }
-    result.next = i;
+    result.next = ReadLeadingGlobals(reader, result.globals, args, result.error);
     return result;
 }
 
@@ -471,10 +478,13 @@ Invocation ParseCommandLine(const std::shared_ptr<NamespaceNode>& root, const st
         return inv;
     };
 
-    const auto leading = ParseLeadingGlobals(args);
-    inv.globals = leading.globals;
-    if (!leading.error.empty()) {
-        inv.error = leading.error;
+    // One reader for the whole line, so that an option given both before and after the path
+    // counts as given twice.
+    GlobalReader globals(inv.globals);
+    std::string leadingError;
+    const std::size_t next = ReadLeadingGlobals(globals, inv.globals, args, leadingError);
+    if (!leadingError.empty()) {
+        inv.error = leadingError;
         return inv;
     }
     if (inv.globals.version) {
@@ -497,9 +507,8 @@ Invocation ParseCommandLine(const std::shared_ptr<NamespaceNode>& root, const st
         return inv;
     }
 
-    GlobalReader globals(inv.globals);
     std::optional<ParameterReader> parameters;
-    for (std::size_t i = leading.next; i < args.size(); ++i) {
+    for (std::size_t i = next; i < args.size(); ++i) {
         const std::string& arg = args[i];
         std::string error;
         // A command's own parameter wins over a global option of the same name.
@@ -543,8 +552,10 @@ Invocation ParseCommandLine(const std::shared_ptr<NamespaceNode>& root, const st
         inv.node = child;
         if (auto command = std::dynamic_pointer_cast<Command>(child)) {
             inv.command = command;
+            auto spec = command->GetInputSpec();
             inv.input = Input::New();
-            parameters.emplace(command->GetInputSpec(), inv.input);
+            inv.input->Declare(spec, JoinPath(inv.path));
+            parameters.emplace(std::move(spec), inv.input);
         }
     }
 

@@ -401,7 +401,7 @@ public:
     }
 
 private:
-    static constexpr std::size_t kChunk = 64 * 1024;
+    static constexpr std::size_t kChunk = std::size_t{64} * 1024;
     const TextSink& sink_;
     std::string buffer_;
 };

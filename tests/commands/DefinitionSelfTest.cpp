@@ -1,6 +1,11 @@
-// Walks every command definition of the registered tree, with every feature switch on
-// and with every switch off, and checks what must hold for all of them.
+// Walks every command definition of the registered tree, with every feature switch on, with
+// every switch off and with each switch off on its own, and checks what must hold for all of
+// them: well-formed definitions, one place for each command, switches that only take away.
 
+#include <algorithm>
+#include <filesystem>
+#include <fstream>
+#include <iterator>
 #include <regex>
 #include <set>
 #include <sstream>
@@ -8,10 +13,16 @@
 #include <vector>
 
 #include <gtest/gtest.h>
+#include <nlohmann/json.hpp>
 
+#include "framework/TreeWalk.h"
+#include "host/HostState.h"
 #include "quillets/QuilletException.h"
 #include "registration/Registration.h"
+#include "support/FixtureCase.h"
 #include "support/HostFixture.h"
+
+namespace fs = std::filesystem;
 
 using Quillets::AutoCli::Command;
 using Quillets::AutoCli::Namespace;
@@ -36,9 +47,9 @@ void Collect(const std::shared_ptr<NamespaceNode>& node, const std::string& path
     }
 }
 
-std::vector<Definition> RegisteredTree()
+std::vector<Definition> RegisteredTree(std::shared_ptr<NamespaceNode>& root)
 {
-    auto root = Namespace::New();
+    root = Namespace::New();
     root->SetName("root");
     auto storage = Namespace::New();
     storage->SetDescription("Manage storage.");
@@ -97,7 +108,8 @@ std::vector<std::string> Problems(Command& command)
             if (constraint->GetType() == ParameterConstraintType::StringEnum && constraint->GetStringEnum().empty()) {
                 problems.push_back("'" + name + "' has an empty enumeration");
             }
-            if (constraint->GetType() == ParameterConstraintType::IntRange && constraint->GetMin() > constraint->GetMax()) {
+            if (constraint->GetType() == ParameterConstraintType::IntRange &&
+                constraint->GetMin() > constraint->GetMax()) {
                 problems.push_back("'" + name + "' has an empty integer range");
             }
         }
@@ -158,29 +170,114 @@ std::vector<std::string> Problems(Command& command)
     return problems;
 }
 
+// The host state with every feature switch the simulated host knows set to `on`, or only
+// `off` set to false when it is given.
+std::string SwitchState(bool on, const std::string& off = "")
+{
+    nlohmann::json features = nlohmann::json::object();
+    for (const char* key : HostSim::Model::kFeatureKeys) {
+        features[key] = off.empty() ? on : key != off;
+    }
+    return nlohmann::json{{"features", features}}.dump();
+}
+
+// The command paths of the tree registered under `state`, checking each definition and the
+// tree's shape on the way.
+std::set<std::string> CommandPaths(const std::string& state)
+{
+    TestSupport::ScopedHost host(state);
+    std::set<std::string> paths;
+    std::set<const NamespaceNode*> nodes;
+    std::shared_ptr<NamespaceNode> root;
+    for (const auto& [path, node] : RegisteredTree(root)) {
+        SCOPED_TRACE(state + ": " + path);
+        EXPECT_TRUE(nodes.insert(node.get()).second) << "one node object registered at two places";
+        if (auto command = std::dynamic_pointer_cast<Command>(node)) {
+            EXPECT_TRUE(paths.insert(path).second) << "command path registered twice";
+            EXPECT_TRUE(command->GetChildren().empty());
+            EXPECT_EQ(Problems(*command), std::vector<std::string>{});
+            // Describing a command twice must give the same, independent answer.
+            EXPECT_EQ(command->GetInputSpec()->GetParameters().size(), command->GetInputSpec()->GetParameters().size());
+            EXPECT_NE(command->GetOutputSpec()->GetRootObject(), command->GetOutputSpec()->GetRootObject());
+        } else {
+            EXPECT_FALSE(node->GetDescription().empty()) << "namespace without description";
+        }
+    }
+    // The list the front end shows (--help, the command list) holds the same commands.
+    std::set<std::string> listed;
+    for (const auto& entry : Quillets::Cli::ListCommands(root)) {
+        listed.insert(Quillets::Cli::JoinPath(entry.path));
+    }
+    EXPECT_EQ(listed, paths) << state;
+    return paths;
+}
+
+std::vector<std::string> Missing(const std::set<std::string>& from, const std::set<std::string>& in)
+{
+    std::vector<std::string> missing;
+    std::set_difference(from.begin(), from.end(), in.begin(), in.end(), std::back_inserter(missing));
+    return missing;
+}
+
 TEST(DefinitionSelfTest, EveryCommandDefinitionIsWellFormed)
 {
-    for (const bool on : {true, false}) {
-        const std::string value = on ? "true" : "false";
-        TestSupport::ScopedHost host(R"({"features": {"102": )" + value + R"(, "103": )" + value + R"(, "104": )" +
-                                     value + R"(, "270": )" + value + "}}");
-        int commands = 0;
-        for (const auto& [path, node] : RegisteredTree()) {
-            SCOPED_TRACE((on ? "switches on: " : "switches off: ") + path);
-            if (auto command = std::dynamic_pointer_cast<Command>(node)) {
-                ++commands;
-                EXPECT_TRUE(command->GetChildren().empty());
-                EXPECT_EQ(Problems(*command), std::vector<std::string>{});
-                // Describing a command twice must give the same, independent answer.
-                EXPECT_EQ(command->GetInputSpec()->GetParameters().size(),
-                          command->GetInputSpec()->GetParameters().size());
-                EXPECT_NE(command->GetOutputSpec()->GetRootObject(), command->GetOutputSpec()->GetRootObject());
-            } else {
-                EXPECT_FALSE(node->GetDescription().empty()) << "namespace without description";
-            }
+    const auto all = CommandPaths(SwitchState(true));
+    const auto none = CommandPaths(SwitchState(false));
+    ASSERT_FALSE(all.empty());
+    // A switch only ever takes commands away, and each switch on its own: the commands missing
+    // with every switch off are exactly those that some single switch takes away.
+    EXPECT_EQ(Missing(none, all), std::vector<std::string>{}) << "commands that exist only with switches off";
+    std::set<std::string> takenAway;
+    for (const char* key : HostSim::Model::kFeatureKeys) {
+        const auto without = CommandPaths(SwitchState(true, key));
+        EXPECT_EQ(Missing(without, all), std::vector<std::string>{}) << "switch " << key;
+        for (const auto& path : Missing(all, without)) {
+            takenAway.insert(path);
         }
-        EXPECT_EQ(commands, on ? 40 : 38);
     }
+    EXPECT_EQ(Missing(all, none), std::vector<std::string>(takenAway.begin(), takenAway.end()));
+}
+
+// Words of every run of every fixture case.
+std::vector<std::vector<std::string>> FixtureRuns()
+{
+    std::vector<std::vector<std::string>> runs;
+    for (const auto& entry : fs::recursive_directory_iterator(STORAGECLI_CASES_DIR)) {
+        if (!entry.is_regular_file() || entry.path().extension() != ".case") {
+            continue;
+        }
+        std::ifstream in(entry.path(), std::ios::binary);
+        std::ostringstream text;
+        text << in.rdbuf();
+        for (auto& step : TestSupport::ParseFixtureCase(text.str()).steps) {
+            runs.push_back(std::move(step.args));
+        }
+    }
+    return runs;
+}
+
+// The count of commands is whatever registration makes it; what keeps it honest is that every
+// registered command is run by a fixture case, so a command that drops out of the tree fails
+// its cases, and a new command cannot come without one.
+TEST(DefinitionSelfTest, EveryRegisteredCommandHasAFixtureCase)
+{
+    const auto runs = FixtureRuns();
+    ASSERT_FALSE(runs.empty());
+    std::vector<std::string> uncovered;
+    for (const auto& path : CommandPaths(SwitchState(true))) {
+        std::vector<std::string> words;
+        std::istringstream split(path);
+        for (std::string word; split >> word;) {
+            words.push_back(word);
+        }
+        const bool run = std::any_of(runs.begin(), runs.end(), [&](const std::vector<std::string>& args) {
+            return std::search(args.begin(), args.end(), words.begin(), words.end()) != args.end();
+        });
+        if (!run) {
+            uncovered.push_back(path);
+        }
+    }
+    EXPECT_EQ(uncovered, std::vector<std::string>{});
 }
 
 } // namespace

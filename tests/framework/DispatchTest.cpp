@@ -89,6 +89,13 @@ INSTANTIATE_TEST_SUITE_P(
                      {}, 3, "", "before\nhost is down\n"},
         DispatchCase{"unknown_exception", [](const Input&, Output&) { throw 42; }, {}, 3, "",
                      "An unknown exception stopped the command.\n"},
+        DispatchCase{"undeclared_parameter_read",
+                     [](const Input& in, Output& out) {
+                         if (in.GetParameter("nmae").empty()) {
+                             out.SetRootObject(OneRow());
+                         }
+                     },
+                     {}, 3, "", "Command 'cmd' reads parameter 'nmae', which it does not declare.\n"},
         DispatchCase{"usage_error_runs_nothing", [](const Input&, Output&) {}, {"--bogus"}, 2, "",
                      "Unknown parameter '--bogus' for 'cmd'. See 'autocli cmd --help'.\n"}),
     [](const auto& info) { return std::string(info.param.name); });

@@ -37,7 +37,7 @@ protected:
 
     std::string State(const std::string& json)
     {
-        const auto path = (dir_ / "host.json").string();
+        auto path = (dir_ / "host.json").string();
         std::ofstream(path) << json;
         return path;
     }
@@ -82,6 +82,19 @@ TEST_F(Autocli, UsageErrorsAreOneLineAndExitTwo)
         {{"storage"}, "'storage' is a namespace: name one of its commands."},
         // Bytes that are not UTF-8 are shown as escapes, so the message stays one valid line.
         {{"storage", "caf\xe9\x1b[2J"}, "Unknown namespace or command 'caf\\xe9\\x1b[2J' in 'storage'. See"},
+        // Single-valued global options, wherever they stand.
+        {{"--state", "one.json", "--state", "other.json", "storage", "filesystem", "list"},
+         "Option '--state' given more than once."},
+        {{"--formatter", "json", "--formatter", "table", "storage", "filesystem", "list"},
+         "Option '--formatter' given more than once."},
+        {{"--formatter", "json", "storage", "filesystem", "list", "--formatter", "json"},
+         "Option '--formatter' given more than once."},
+        {{"--format-param", "show-header=false", "storage", "filesystem", "list", "--format-param", "show-header=true"},
+         "Format parameter 'show-header' given more than once."},
+        {{"storage", "filesystem", "list", "--format-param", "fields=Mount Point", "--format-param=fields=Type"},
+         "Format parameter 'fields' given more than once."},
+        {{"storage", "internal", "clusteredhdsk", "set", "-l", "datastore1", "-e", "onn"},
+         "Invalid value 'onn' for '--enabled': expected true or false (also yes/no, 1/0, on/off)."},
     };
     for (const auto& run : runs) {
         auto result = RunAutocli(run.args, DemoState());
@@ -89,6 +102,38 @@ TEST_F(Autocli, UsageErrorsAreOneLineAndExitTwo)
         EXPECT_EQ(result.out, "");
         EXPECT_EQ(result.err.rfind(run.start, 0), 0u) << result.err;
         EXPECT_EQ(std::count(result.err.begin(), result.err.end(), '\n'), 1) << result.err;
+    }
+}
+
+TEST_F(Autocli, FormatParamsWithDifferentKeysCombine)
+{
+    auto result = RunAutocli({"--format-param", "show-header=off", "storage", "filesystem", "list", "--format-param",
+                              "fields=Volume Name,Type", "--formatter", "csv"},
+                             DemoState());
+    EXPECT_EQ(result.exitCode, 0) << result.err;
+    EXPECT_EQ(result.out.rfind("datastore1,", 0), 0u) << result.out;
+    EXPECT_EQ(result.out.find("Volume Name"), std::string::npos) << result.out;
+}
+
+TEST_F(Autocli, BoolParameterSpellings)
+{
+    const std::vector<std::pair<std::string, bool>> spellings{
+        {"on", true}, {"ON", true}, {"Off", false}, {"off", false}, {"yes", true},
+        {"NO", false}, {"1", true}, {"0", false}, {"True", true}, {"FALSE", false}};
+    const auto state = DemoState();
+    for (const auto& [text, value] : spellings) {
+        // Start from the other state, so that an ignored value cannot pass.
+        auto before = RunAutocli({"storage", "internal", "clusteredhdsk", "set", "-l", "datastore1", "-e",
+                                  value ? "false" : "true"},
+                                 state);
+        ASSERT_EQ(before.exitCode, 0) << before.err;
+        auto set = RunAutocli({"storage", "internal", "clusteredhdsk", "set", "-l", "datastore1", "--enabled", text},
+                              state);
+        EXPECT_EQ(set.exitCode, 0) << text << ": " << set.err;
+        auto get = RunAutocli({"--formatter", "json", "storage", "internal", "clusteredhdsk", "get", "-l", "datastore1"},
+                              state);
+        ASSERT_EQ(get.exitCode, 0) << get.err;
+        EXPECT_EQ(nlohmann::json::parse(get.out)["Enabled"], value) << text;
     }
 }
 

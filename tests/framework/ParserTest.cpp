@@ -5,6 +5,7 @@
 #include "FakeCommand.h"
 #include "framework/Help.h"
 #include "framework/Parser.h"
+#include "quillets/QuilletException.h"
 
 using namespace Quillets::Cli;
 using namespace FrameworkTest;
@@ -82,7 +83,7 @@ TEST(Parser, ReadsEveryParameterKind)
     EXPECT_EQ(in.GetParameter("level"), "low");
     EXPECT_EQ(in.GetParameter("Index"), "upper");
     EXPECT_EQ(in.GetParameter("index"), "lower");
-    EXPECT_FALSE(in.HasParameter("missing"));
+    EXPECT_THROW(in.HasParameter("missing"), Quillets::QuilletException);
 }
 
 TEST(Parser, GlobalOptionsBeforeAndAfterThePath)
@@ -119,8 +120,6 @@ TEST_P(UsageErrors, NameTheProblemAndPointToHelp)
     EXPECT_EQ(inv.error.find('\n'), std::string::npos);
     EXPECT_EQ(tree.set->executions, 0);
 }
-
-const char* const kSetHelp = " See 'autocli storage volume set --help'.";
 
 INSTANTIATE_TEST_SUITE_P(
     EachClass, UsageErrors,
@@ -164,7 +163,20 @@ INSTANTIATE_TEST_SUITE_P(
         UsageCase{"format_param_without_equals", {"--format-param", "fields"}, true,
                   "Invalid --format-param 'fields': expected KEY=VALUE. See 'autocli --help'."},
         UsageCase{"state_after_path", {"-n", "x", "--state", "f"}, false,
-                  "Option '--state' must come before the command path. See 'autocli storage volume set --help'."}),
+                  "Option '--state' must come before the command path. See 'autocli storage volume set --help'."},
+        UsageCase{"state_twice", {"--state", "a", "--state=b", "storage", "volume", "set", "-n", "x"}, true,
+                  "Option '--state' given more than once. See 'autocli --help'."},
+        UsageCase{"formatter_twice_before_path", {"--formatter", "json", "--formatter=json", "storage"}, true,
+                  "Option '--formatter' given more than once. See 'autocli --help'."},
+        UsageCase{"formatter_before_and_after_path", {"--formatter", "json", "storage", "volume", "set", "-n", "x", "--formatter", "csv"},
+                  true, "Option '--formatter' given more than once. See 'autocli storage volume set --help'."},
+        UsageCase{"formatter_twice_after_path", {"-n", "x", "--formatter", "csv", "--formatter", "csv"}, false,
+                  "Option '--formatter' given more than once. See 'autocli storage volume set --help'."},
+        UsageCase{"format_key_before_and_after_path",
+                  {"--format-param", "show-header=no", "storage", "volume", "set", "-n", "x", "--format-param=show-header=yes"},
+                  true, "Format parameter 'show-header' given more than once. See 'autocli storage volume set --help'."},
+        UsageCase{"fields_twice", {"-n", "x", "--format-param", "fields=Name", "--format-param", "fields=Size"}, false,
+                  "Format parameter 'fields' given more than once. See 'autocli storage volume set --help'."}),
     [](const auto& info) { return std::string(info.param.name); });
 
 TEST(Parser, HelpStopsAtThePathGivenSoFar)
@@ -177,6 +189,24 @@ TEST(Parser, HelpStopsAtThePathGivenSoFar)
     inv = tree.Parse({"-n", "--help"});
     ASSERT_EQ(inv.action, Invocation::Action::Run) << inv.error;
     EXPECT_EQ(inv.input->GetParameter("name"), "--help");
+}
+
+TEST(Parser, BoolSpellingsInAnyCase)
+{
+    const std::vector<std::pair<const char*, bool>> accepted{
+        {"true", true}, {"TRUE", true}, {"yes", true}, {"Yes", true}, {"1", true},   {"on", true},  {"ON", true},
+        {"oN", true},   {"false", false}, {"False", false}, {"no", false}, {"NO", false}, {"0", false}, {"off", false},
+        {"OFF", false}, {"Off", false}};
+    for (const auto& [text, value] : accepted) {
+        EXPECT_EQ(ParseBool(text), value) << text;
+        Tree tree;
+        auto inv = tree.Parse({"-n", "x", "-e", text});
+        ASSERT_EQ(inv.action, Invocation::Action::Run) << text << ": " << inv.error;
+        EXPECT_EQ(inv.input->GetParameterBool("enabled"), value) << text;
+    }
+    for (const char* bad : {"", "o", "onn", "of", "offf", "2", "-1", "t", "y", " on", "on "}) {
+        EXPECT_FALSE(ParseBool(bad)) << bad;
+    }
 }
 
 TEST(Parser, Int64Boundaries)

@@ -20,7 +20,7 @@ std::shared_ptr<MetaList> TwoVolumes()
     return list;
 }
 
-std::string Render(const std::shared_ptr<MetaObject>& result, const std::string& formatter, OutputHints hints = {},
+std::string Render(const std::shared_ptr<MetaObject>& result, const std::string& formatter, const OutputHints& hints = {},
                    OutputOptions options = {})
 {
     options.formatter = formatter;

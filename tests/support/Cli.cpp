@@ -121,6 +121,10 @@ CliResult RunAutocli(const std::vector<std::string>& args, const std::string& st
 
 CommandResult Execute(Quillets::AutoCli::Command& command, const std::shared_ptr<Quillets::CallSpec::Input>& in)
 {
+    // As autocli does: the command may read only what it declares.
+    if (in && !in->IsDeclared()) {
+        in->Declare(command.GetInputSpec(), command.GetName());
+    }
     auto out = Quillets::CallSpec::Output::New();
     command.Execute(in, out);
     return {out->GetErrorMessages(), out->GetRootObject()};

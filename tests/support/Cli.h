@@ -26,7 +26,8 @@ struct CommandResult {
     std::shared_ptr<Quillets::MetaObj::MetaObject> root;
 };
 
-// Runs `command` in process with `in` on a fresh Output.
+// Runs `command` in process with `in` on a fresh Output; `in` is declared with the
+// command's input description first, so reading an undeclared parameter throws.
 CommandResult Execute(Quillets::AutoCli::Command& command, const std::shared_ptr<Quillets::CallSpec::Input>& in);
 
 // Renders `root` with the named formatter ("table", "simple", "json", "csv") and the

@@ -1,0 +1,115 @@
+// Reading the parsed arguments: what a command declared reads as its value or as empty,
+// anything else is a fault in the command and must fail loudly.
+
+#include <functional>
+#include <ostream>
+
+#include <gtest/gtest.h>
+
+#include "FakeCommand.h"
+#include "quillets/QuilletException.h"
+
+using namespace FrameworkTest;
+using Quillets::QuilletException;
+
+namespace {
+
+std::shared_ptr<InputSpec> OneOfEachKind()
+{
+    auto inputs = InputSpec::New();
+    inputs->AddParameter(Param("name", "n", ParameterType::String));
+    inputs->AddParameter(Param("depth", "q", ParameterType::Int));
+    inputs->AddParameter(Param("enabled", "e", ParameterType::Bool));
+    inputs->AddParameter(Param("force", "f", ParameterType::Flag));
+    inputs->AddParameter(Param("hosts", "H", ParameterType::StringList));
+    return inputs;
+}
+
+struct ReadCase {
+    const char* name;
+    std::function<void(const Input&)> read;
+    const char* error; // "" when the read is allowed
+};
+
+void PrintTo(const ReadCase& c, std::ostream* os) { *os << c.name; }
+
+class Reading : public ::testing::TestWithParam<ReadCase> {};
+
+TEST_P(Reading, DeclaredNamesOnlyAndAsDeclared)
+{
+    const auto& c = GetParam();
+    auto in = Input::New();
+    in->Declare(OneOfEachKind(), "storage volume set");
+    if (*c.error == '\0') {
+        EXPECT_NO_THROW(c.read(*in));
+        return;
+    }
+    try {
+        c.read(*in);
+        ADD_FAILURE() << "no exception";
+    } catch (const QuilletException& e) {
+        EXPECT_STREQ(e.what(), c.error);
+    }
+}
+
+std::vector<std::string> List(const Input& in, const std::string& name)
+{
+    std::vector<std::string> values{"stale"};
+    in.GetParameterList(name, values);
+    return values;
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    EachReader, Reading,
+    ::testing::Values(
+        ReadCase{"string", [](const Input& in) { EXPECT_EQ(in.GetParameter("name"), ""); }, ""},
+        ReadCase{"int", [](const Input& in) { EXPECT_EQ(in.GetParameterInt("depth"), 0); }, ""},
+        ReadCase{"bool", [](const Input& in) { EXPECT_FALSE(in.GetParameterBool("enabled")); }, ""},
+        ReadCase{"flag", [](const Input& in) { EXPECT_FALSE(in.IsFlagSet("force")); }, ""},
+        ReadCase{"flag_as_bool", [](const Input& in) { EXPECT_FALSE(in.GetParameterBool("force")); }, ""},
+        ReadCase{"list", [](const Input& in) { EXPECT_TRUE(List(in, "hosts").empty()); }, ""},
+        ReadCase{"has_declared", [](const Input& in) { EXPECT_FALSE(in.HasParameter("depth")); }, ""},
+        ReadCase{"misspelt_string", [](const Input& in) { in.GetParameter("nmae"); },
+                 "Command 'storage volume set' reads parameter 'nmae', which it does not declare."},
+        ReadCase{"misspelt_int", [](const Input& in) { in.GetParameterInt("dpeth"); },
+                 "Command 'storage volume set' reads parameter 'dpeth', which it does not declare."},
+        ReadCase{"misspelt_bool", [](const Input& in) { in.GetParameterBool("enable"); },
+                 "Command 'storage volume set' reads parameter 'enable', which it does not declare."},
+        ReadCase{"misspelt_flag", [](const Input& in) { in.IsFlagSet("forced"); },
+                 "Command 'storage volume set' reads parameter 'forced', which it does not declare."},
+        ReadCase{"misspelt_list", [](const Input& in) { List(in, "host"); },
+                 "Command 'storage volume set' reads parameter 'host', which it does not declare."},
+        ReadCase{"has_undeclared", [](const Input& in) { in.HasParameter("Name"); },
+                 "Command 'storage volume set' reads parameter 'Name', which it does not declare."},
+        ReadCase{"int_as_string", [](const Input& in) { in.GetParameter("depth"); },
+                 "Command 'storage volume set' reads parameter 'depth' as a string, but declares it as an integer."},
+        ReadCase{"string_as_int", [](const Input& in) { in.GetParameterInt("name"); },
+                 "Command 'storage volume set' reads parameter 'name' as an integer, but declares it as a string."},
+        ReadCase{"bool_as_flag", [](const Input& in) { in.IsFlagSet("enabled"); },
+                 "Command 'storage volume set' reads parameter 'enabled' as a flag, but declares it as a boolean."},
+        ReadCase{"list_as_string", [](const Input& in) { in.GetParameter("hosts"); },
+                 "Command 'storage volume set' reads parameter 'hosts' as a string, but declares it as a string list."},
+        ReadCase{"string_as_list", [](const Input& in) { List(in, "name"); },
+                 "Command 'storage volume set' reads parameter 'name' as a string list, but declares it as a string."}),
+    [](const auto& info) { return std::string(info.param.name); });
+
+TEST(Reading, GivenValuesReadBackThroughTheDeclaration)
+{
+    auto in = Input::New();
+    in->SetParameter("name", "vol1");
+    in->SetParameterInt("depth", -7);
+    in->SetParameterBool("enabled", true);
+    in->SetFlag("force");
+    in->AddParameterListValue("hosts", "a");
+    in->AddParameterListValue("hosts", "b");
+    in->Declare(OneOfEachKind(), "cmd");
+    EXPECT_EQ(in->GetParameter("name"), "vol1");
+    EXPECT_EQ(in->GetParameterInt("depth"), -7);
+    EXPECT_TRUE(in->GetParameterBool("enabled"));
+    EXPECT_TRUE(in->IsFlagSet("force"));
+    EXPECT_EQ(List(*in, "hosts"), (std::vector<std::string>{"a", "b"}));
+    EXPECT_TRUE(in->HasParameter("depth"));
+    EXPECT_THROW(in->Declare(nullptr, "cmd"), QuilletException);
+}
+
+} // namespace
