@@ -1,8 +1,8 @@
-#include "hlfs/HLFSReclaimConfig.h"
-
 #include <limits>
 
-#include "hlfs/HlfsVolumeSelection.h"
+#include "command/Selection.h"
+#include "command/StorageCommand.h"
+#include "hlfs/Manifest.h"
 
 namespace OrvaneCli::FileSystem {
 
@@ -10,7 +10,6 @@ using HostCtl::Storage::HlfsVolumeUnmapProperty;
 
 namespace {
 
-constexpr const char* kStructureName = "HlfsReclaim";
 constexpr const char* kGranularityField = "Reclaim Granularity";
 constexpr const char* kPriorityField = "Reclaim Priority";
 constexpr const char* kMethodField = "Reclaim Method";
@@ -29,43 +28,39 @@ constexpr std::int64_t kMaxGranularity = std::numeric_limits<std::uint32_t>::max
 constexpr std::int64_t kMinBandwidth = std::numeric_limits<std::int32_t>::min();
 constexpr std::int64_t kMaxBandwidth = std::numeric_limits<std::int32_t>::max();
 
-std::shared_ptr<MetaStruct> EmptyReclaimStructure()
-{
-    auto structure = MetaStruct::New(kStructureName);
-    structure->SetField(kGranularityField, MetaInt::New());
-    structure->SetField(kPriorityField, MetaString::New());
-    structure->SetField(kMethodField, MetaString::New());
-    structure->SetField(kBandwidthField, MetaInt::New());
-    return structure;
-}
+const ColumnTable kColumns("HlfsReclaim", {
+                                              {.title = kGranularityField, .type = ColumnType::Int, .unit = "Bytes"},
+                                              {kPriorityField, ColumnType::String},
+                                              {kMethodField, ColumnType::String},
+                                              {.title = kBandwidthField, .type = ColumnType::Int, .unit = "MB/s"},
+                                          });
+
+// storage hlfs reclaim config get
+class HLFSReclaimConfigGet final : public StorageCommand {
+public:
+    HLFSReclaimConfigGet()
+        : StorageCommand({"Get space reclamation configuration parameters", One(kColumns), "simple"})
+    {
+    }
+
+private:
+    void DeclareParameters(const std::shared_ptr<InputSpec>& inputs) override { AddSingleHLFSVolumeParameters(inputs); }
+    void Run(const InputPtr& in, const OutputPtr& out) override;
+};
+
+// storage hlfs reclaim config set
+class HLFSReclaimConfigSet final : public StorageCommand {
+public:
+    HLFSReclaimConfigSet() : StorageCommand({"Set space reclamation configuration parameters"}) {}
+
+private:
+    void DeclareParameters(const std::shared_ptr<InputSpec>& inputs) override;
+    void Run(const InputPtr& in, const OutputPtr& out) override;
+};
 
 } // namespace
 
-std::shared_ptr<HLFSReclaimConfigGet> HLFSReclaimConfigGet::New()
-{
-    return std::shared_ptr<HLFSReclaimConfigGet>(new HLFSReclaimConfigGet());
-}
-
-HLFSReclaimConfigGet::HLFSReclaimConfigGet()
-{
-    SetDescription("Get space reclamation configuration parameters");
-    SetDefaultOutputFormatter("simple");
-    SetDefaultOutputParameter("fields:HlfsReclaim",
-                              "Reclaim Granularity,Reclaim Priority,Reclaim Method,Reclaim Bandwidth");
-    SetDefaultOutputParameter("units:HlfsReclaim.Reclaim Bandwidth", "MB/s");
-    SetDefaultOutputParameter("units:HlfsReclaim.Reclaim Granularity", "Bytes");
-}
-
-HLFSReclaimConfigGet::~HLFSReclaimConfigGet() = default;
-
-std::shared_ptr<InputSpec> HLFSReclaimConfigGet::GetInputSpecInternal() { return GetSingleHLFSVolumeInputSpec(); }
-
-std::shared_ptr<OutputSpec> HLFSReclaimConfigGet::GetOutputSpecInternal()
-{
-    return StructOutputSpec(EmptyReclaimStructure());
-}
-
-void HLFSReclaimConfigGet::ExecuteInternal(const InputPtr& in, const OutputPtr& out)
+void HLFSReclaimConfigGet::Run(const InputPtr& in, const OutputPtr& out)
 {
     const std::unique_ptr<HlFileSystem> volume = GetSingleHLFSVolume(in, out);
     if (!volume) {
@@ -73,27 +68,19 @@ void HLFSReclaimConfigGet::ExecuteInternal(const InputPtr& in, const OutputPtr& 
     }
     Guarded(out, [&] {
         const HlfsVolumeUnmapProperty property = volume->GetUnmapProperty();
-        auto structure = EmptyReclaimStructure();
-        structure->SetField(kGranularityField, static_cast<long>(property.granularity));
-        structure->SetField(kPriorityField, property.priority);
-        structure->SetField(kMethodField, property.method);
-        structure->SetField(kBandwidthField, static_cast<int>(property.bandwidth));
-        out->SetRootObject(structure);
+        const RowShape shape = Rows();
+        auto structure = shape.NewRow();
+        structure.Set(kGranularityField, static_cast<long>(property.granularity));
+        structure.Set(kPriorityField, property.priority);
+        structure.Set(kMethodField, property.method);
+        structure.Set(kBandwidthField, static_cast<int>(property.bandwidth));
+        out->SetRootObject(structure.Structure());
     });
 }
 
-std::shared_ptr<HLFSReclaimConfigSet> HLFSReclaimConfigSet::New()
+void HLFSReclaimConfigSet::DeclareParameters(const std::shared_ptr<InputSpec>& inputs)
 {
-    return std::shared_ptr<HLFSReclaimConfigSet>(new HLFSReclaimConfigSet());
-}
-
-HLFSReclaimConfigSet::HLFSReclaimConfigSet() { SetDescription("Set space reclamation configuration parameters"); }
-
-HLFSReclaimConfigSet::~HLFSReclaimConfigSet() = default;
-
-std::shared_ptr<InputSpec> HLFSReclaimConfigSet::GetInputSpecInternal()
-{
-    auto inputs = GetSingleHLFSVolumeInputSpec();
+    AddSingleHLFSVolumeParameters(inputs);
     AddParameter(inputs, {kGranularityParameter, "g", ParameterType::Int,
                         "Minimum granularity of automatic space reclamation in bytes"});
     AddParameter(inputs, {kPriorityParameter, "p", ParameterType::String,
@@ -103,12 +90,9 @@ std::shared_ptr<InputSpec> HLFSReclaimConfigSet::GetInputSpecInternal()
                         "Method of automatic space reclamation.  Supported options are %ENUM%.", false,
                         StringEnum({{kMethodPriority, ""}, {kMethodFixed, ""}})});
     AddParameter(inputs, {kBandwidthParameter, "b", ParameterType::Int, "Space reclamation fixed bandwidth (MB/s)"});
-    return inputs;
 }
 
-std::shared_ptr<OutputSpec> HLFSReclaimConfigSet::GetOutputSpecInternal() { return BooleanOutputSpec(); }
-
-void HLFSReclaimConfigSet::ExecuteInternal(const InputPtr& in, const OutputPtr& out)
+void HLFSReclaimConfigSet::Run(const InputPtr& in, const OutputPtr& out)
 {
     // The volume comes first: a selection error hides any parameter error.
     const std::unique_ptr<HlFileSystem> volume = GetSingleHLFSVolume(in, out);
@@ -174,5 +158,8 @@ void HLFSReclaimConfigSet::ExecuteInternal(const InputPtr& in, const OutputPtr& 
         out->SetRootObject(MetaBool::New(true));
     });
 }
+
+NodePtr NewHLFSReclaimConfigGet() { return New<HLFSReclaimConfigGet>(); }
+NodePtr NewHLFSReclaimConfigSet() { return New<HLFSReclaimConfigSet>(); }
 
 } // namespace OrvaneCli::FileSystem

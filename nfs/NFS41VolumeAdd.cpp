@@ -1,8 +1,9 @@
-#include "nfs/NFS41VolumeAdd.h"
-
 #include <string>
 #include <vector>
 
+#include "command/Selection.h"
+#include "command/StorageCommand.h"
+#include "nfs/Manifest.h"
 #include "nfs/NfsAddCommon.h"
 
 namespace OrvaneCli::FileSystem {
@@ -27,23 +28,26 @@ NetworkFileSystem::SecurityType ToSecurityType(const std::string& flavour)
     return NetworkFileSystem::SEC_SYS;
 }
 
+// storage nfs41 add
+class NFS41VolumeAdd final : public StorageCommand {
+public:
+    NFS41VolumeAdd()
+        : StorageCommand({"Add a new NFS v4.1 volume to the Zephal Host and mount it with the given volume name."})
+    {
+    }
+
+private:
+    void DeclareParameters(const std::shared_ptr<InputSpec>& inputs) override;
+    void Run(const InputPtr& in, const OutputPtr& out) override;
+};
+
 } // namespace
 
-std::shared_ptr<NFS41VolumeAdd> NFS41VolumeAdd::New() { return std::shared_ptr<NFS41VolumeAdd>(new NFS41VolumeAdd()); }
-
-NFS41VolumeAdd::NFS41VolumeAdd()
-{
-    SetDescription("Add a new NFS v4.1 volume to the Zephal Host and mount it with the given volume name.");
-}
-
-NFS41VolumeAdd::~NFS41VolumeAdd() = default;
-
-std::shared_ptr<InputSpec> NFS41VolumeAdd::GetInputSpecInternal()
+void NFS41VolumeAdd::DeclareParameters(const std::shared_ptr<InputSpec>& inputs)
 {
     const bool knxnicBinding = IsFeatureEnabled(Feature::Nfs41KnxnicBinding);
-    auto inputs = InputSpec::New();
     if (knxnicBinding) {
-        AddParameter(inputs, {NfsAddArg::kHostKnxnic, "I", ParameterType::StringList,
+        AddParameter(inputs, {kOptionHostKnxnic, "I", ParameterType::StringList,
                             "The hostname or IP address followed by a colon(:) and knxnic name. This parameter can "
                             "be specified more than once. E.g.: --host-knxnic=host1:knxnic1 "
                             "--host-knxnic=ip2:knxnic2"});
@@ -71,12 +75,9 @@ std::shared_ptr<InputSpec> NFS41VolumeAdd::GetInputSpecInternal()
               "Kerberos authentication with RPC header integrity protection"},
              {NetworkFileSystem::NFS_AUTH_KRB5I_STR.c_str(), "Kerberos authentication with data integrity protection"},
          })});
-    return inputs;
 }
 
-std::shared_ptr<OutputSpec> NFS41VolumeAdd::GetOutputSpecInternal() { return BooleanOutputSpec(); }
-
-void NFS41VolumeAdd::ExecuteInternal(const InputPtr& in, const OutputPtr& out)
+void NFS41VolumeAdd::Run(const InputPtr& in, const OutputPtr& out)
 {
     // The servers come from exactly one of hosts and host-knxnic; host-knxnic texts go to
     // the host as given ("host:knxnic"), unsplit.
@@ -85,9 +86,9 @@ void NFS41VolumeAdd::ExecuteInternal(const InputPtr& in, const OutputPtr& out)
     bool knxnicBound = false;
     if (IsFeatureEnabled(Feature::Nfs41KnxnicBinding)) {
         std::vector<std::string> hostKnxnics;
-        in->GetParameterList(NfsAddArg::kHostKnxnic, hostKnxnics);
-        if (servers.empty() == hostKnxnics.empty()) {
-            out->AddErrorMessage("Either hostName or knxnic should be provided");
+        in->GetParameterList(kOptionHostKnxnic, hostKnxnics);
+        const char* const exactlyOne = "Either hostName or knxnic should be provided";
+        if (!ExactlyOneOf({{!servers.empty(), exactlyOne}, {!hostKnxnics.empty(), exactlyOne}}, exactlyOne, out)) {
             return;
         }
         if (!hostKnxnics.empty()) {
@@ -116,5 +117,7 @@ void NFS41VolumeAdd::ExecuteInternal(const InputPtr& in, const OutputPtr& out)
         }
     });
 }
+
+NodePtr NewNFS41VolumeAdd() { return New<NFS41VolumeAdd>(); }
 
 } // namespace OrvaneCli::FileSystem

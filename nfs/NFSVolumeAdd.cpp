@@ -1,7 +1,8 @@
-#include "nfs/NFSVolumeAdd.h"
-
 #include <optional>
 
+#include "command/Selection.h"
+#include "command/StorageCommand.h"
+#include "nfs/Manifest.h"
 #include "nfs/NfsAddCommon.h"
 
 namespace OrvaneCli::FileSystem {
@@ -9,7 +10,6 @@ namespace OrvaneCli::FileSystem {
 namespace {
 
 constexpr const char* kHost = "host";
-constexpr const char* kConnections = "connections";
 constexpr const char* kMountRetry = "unsupported-mount-retry";
 constexpr const char* kQueueDepth = "unsupported-queue-depth";
 
@@ -26,11 +26,11 @@ std::optional<NfsServer> ReadServer(const InputPtr& in, const OutputPtr& out)
     if (!IsFeatureEnabled(Feature::NfsKnxnicBinding)) {
         return NfsServer{in->GetParameter(kHost), false, ""};
     }
-    const std::string& hostKnxnic = in->GetParameter(NfsAddArg::kHostKnxnic);
+    const std::string& hostKnxnic = in->GetParameter(kOptionHostKnxnic);
     const std::string& host = in->GetParameter(kHost);
-    if (IsGiven(hostKnxnic) == IsGiven(host)) {
-        // Scripts match this text, misspelling included.
-        out->AddErrorMessage("Either hostName or knxnic shoud be provided");
+    // Scripts match this text, misspelling included.
+    const char* const exactlyOne = "Either hostName or knxnic shoud be provided";
+    if (!ExactlyOneOf({{IsGiven(host), exactlyOne}, {IsGiven(hostKnxnic), exactlyOne}}, exactlyOne, out)) {
         return std::nullopt;
     }
     if (IsGiven(host)) {
@@ -45,26 +45,29 @@ std::optional<NfsServer> ReadServer(const InputPtr& in, const OutputPtr& out)
     return NfsServer{hostKnxnic.substr(0, colon), true, hostKnxnic.substr(colon + 1)};
 }
 
+// storage nfs add
+class NFSVolumeAdd final : public StorageCommand {
+public:
+    NFSVolumeAdd()
+        : StorageCommand({"Add a new NAS volume to the Zephal Host and mount it with the given volume name."})
+    {
+    }
+
+private:
+    void DeclareParameters(const std::shared_ptr<InputSpec>& inputs) override;
+    void Run(const InputPtr& in, const OutputPtr& out) override;
+};
+
 } // namespace
 
-std::shared_ptr<NFSVolumeAdd> NFSVolumeAdd::New() { return std::shared_ptr<NFSVolumeAdd>(new NFSVolumeAdd()); }
-
-NFSVolumeAdd::NFSVolumeAdd()
-{
-    SetDescription("Add a new NAS volume to the Zephal Host and mount it with the given volume name.");
-}
-
-NFSVolumeAdd::~NFSVolumeAdd() = default;
-
-std::shared_ptr<InputSpec> NFSVolumeAdd::GetInputSpecInternal()
+void NFSVolumeAdd::DeclareParameters(const std::shared_ptr<InputSpec>& inputs)
 {
     const bool knxnicBinding = IsFeatureEnabled(Feature::NfsKnxnicBinding);
-    auto inputs = InputSpec::New();
     AddParameter(inputs,
                  {kHost, "H", ParameterType::String,
                   "The hostname or IP address of the NAS volume to add and mount on the system.", !knxnicBinding});
     if (knxnicBinding) {
-        AddParameter(inputs, {NfsAddArg::kHostKnxnic, "I", ParameterType::String,
+        AddParameter(inputs, {kOptionHostKnxnic, "I", ParameterType::String,
                             "The hostname or IP address of the NAS volume to add, followed by a colon(:) and knxnic "
                             "name i.e. <host/IP>:<knxnic> "});
     }
@@ -75,7 +78,7 @@ std::shared_ptr<InputSpec> NFSVolumeAdd::GetInputSpecInternal()
                         "conflict with existing NAS, HLFS or other volume names.",
                         true});
     if (IsFeatureEnabled(Feature::NfsConnections)) {
-        AddParameter(inputs, {kConnections, "c", ParameterType::Int,
+        AddParameter(inputs, {kOptionConnections, "c", ParameterType::Int,
                             "The number of RPC connections to be established for the NFS datastore. Minimum and "
                             "default values are 1 and maximum is 8. A higher number of connections yields better "
                             "performance on datastores with higher IO load.",
@@ -87,20 +90,17 @@ std::shared_ptr<InputSpec> NFSVolumeAdd::GetInputSpecInternal()
                  {NfsAddArg::kIsPE, "p", ParameterType::Flag, "If set this flag will set the mount point to be PE."});
     AddParameter(inputs, {kMountRetry, "", ParameterType::Flag, ""});
     AddParameter(inputs, {kQueueDepth, "", ParameterType::Int, "", false, IntRange(1, 4294967295L)});
-    return inputs;
 }
 
-std::shared_ptr<OutputSpec> NFSVolumeAdd::GetOutputSpecInternal() { return BooleanOutputSpec(); }
-
-void NFSVolumeAdd::ExecuteInternal(const InputPtr& in, const OutputPtr& out)
+void NFSVolumeAdd::Run(const InputPtr& in, const OutputPtr& out)
 {
     const std::string& share = in->GetParameter(NfsAddArg::kShare);
     const std::string& volumeName = in->GetParameter(kOptionVolumeName);
     const bool readOnly = in->IsFlagSet(NfsAddArg::kReadOnly);
 
     std::int64_t connections = 1;
-    if (IsFeatureEnabled(Feature::NfsConnections) && in->HasParameter(kConnections)) {
-        connections = in->GetParameterInt(kConnections);
+    if (IsFeatureEnabled(Feature::NfsConnections) && in->HasParameter(kOptionConnections)) {
+        connections = in->GetParameterInt(kOptionConnections);
     }
 
     const std::optional<NfsServer> server = ReadServer(in, out);
@@ -137,5 +137,7 @@ void NFSVolumeAdd::ExecuteInternal(const InputPtr& in, const OutputPtr& out)
         }
     });
 }
+
+NodePtr NewNFSVolumeAdd() { return New<NFSVolumeAdd>(); }
 
 } // namespace OrvaneCli::FileSystem

@@ -1,77 +1,80 @@
-#include "nfs/NFSVolumePreunmount.h"
-
 #include <string>
+
+#include "command/StorageCommand.h"
+#include "nfs/Manifest.h"
 
 namespace OrvaneCli::FileSystem {
 
 namespace {
 
-using PreunmountOperation = void (StorageInfoImpl::*)(const std::string&);
+using PreunmountOperation = void (*)(StorageInfoImpl& storage, const std::string& volumeName);
 
-std::shared_ptr<InputSpec> PreunmountInputSpec(const char* volumeNameDescription)
-{
-    auto inputs = InputSpec::New();
-    AddParameter(inputs, {kOptionVolumeName, "v", ParameterType::String, volumeNameDescription, true});
-    return inputs;
-}
-
-// Runs `operation` on the named volume. Unlike other commands, the host's message never
-// stands alone: it is prefixed with `failurePrefix` and the volume name.
-void ChangePreunmountState(const InputPtr& in, const OutputPtr& out, PreunmountOperation operation,
-                           const char* failurePrefix)
-{
-    StorageInfoImpl storage;
-    const std::string& volumeName = in->GetParameter(kOptionVolumeName);
-    try {
-        (storage.*operation)(volumeName);
-        out->SetRootObject(MetaBool::New(true));
-    } catch (const HostCtlException& e) {
-        out->AddErrorMessage(HostCtl::Misc::StrCat(failurePrefix, volumeName, ": ", e.message));
+// Runs one preunmount operation on the named volume. Unlike other commands, the host's
+// message never stands alone: it is prefixed with the command's failure text and the name.
+class PreunmountCommand : public StorageCommand {
+protected:
+    PreunmountCommand(const char* description, const char* volumeName, PreunmountOperation operation,
+                      const char* failurePrefix)
+        : StorageCommand({description}), volumeNameDescription_(volumeName), operation_(operation),
+          failurePrefix_(failurePrefix)
+    {
     }
-}
+
+private:
+    void DeclareParameters(const std::shared_ptr<InputSpec>& inputs) override
+    {
+        AddParameter(inputs, {kOptionVolumeName, "v", ParameterType::String, volumeNameDescription_, true});
+    }
+
+    void Run(const InputPtr& in, const OutputPtr& out) override
+    {
+        // A failure to reach the storage information is not this command's to report.
+        WithStorageInfo(StorageInfoPlacement::Unguarded, out, [&](StorageInfoImpl& storage) {
+            const std::string& volumeName = in->GetParameter(kOptionVolumeName);
+            try {
+                operation_(storage, volumeName);
+                out->SetRootObject(MetaBool::New(true));
+            } catch (const HostCtlException& e) {
+                out->AddErrorMessage(HostCtl::Misc::StrCat(failurePrefix_, volumeName, ": ", e.message));
+            }
+        });
+    }
+
+    const char* volumeNameDescription_;
+    PreunmountOperation operation_;
+    const char* failurePrefix_;
+};
+
+// storage nfs preunmountstate enter
+class NFSVolumePreunmountEnter final : public PreunmountCommand {
+public:
+    NFSVolumePreunmountEnter()
+        : PreunmountCommand("Enter NAS volume to preunmount state.", "Name of the NAS volume to enter preunmount state.",
+                            [](StorageInfoImpl& storage, const std::string& name) {
+                                storage.EnterNetworkFileSystemPreUnmount(name);
+                            },
+                             "Preunmount Enter failed for ")
+    {
+    }
+};
+
+// storage nfs preunmountstate exit
+class NFSVolumePreunmountExit final : public PreunmountCommand {
+public:
+    NFSVolumePreunmountExit()
+        : PreunmountCommand("Exit NAS volume from preunmount state.",
+                            "Name of the NAS volume to exit from preunmount state.",
+                            [](StorageInfoImpl& storage, const std::string& name) {
+                                storage.ExitNetworkFileSystemPreUnmount(name);
+                            },
+                             "Preunmount Exit failed for ")
+    {
+    }
+};
 
 } // namespace
 
-std::shared_ptr<NFSVolumePreunmountEnter> NFSVolumePreunmountEnter::New()
-{
-    return std::make_shared<NFSVolumePreunmountEnter>();
-}
-
-NFSVolumePreunmountEnter::NFSVolumePreunmountEnter() { SetDescription("Enter NAS volume to preunmount state."); }
-
-NFSVolumePreunmountEnter::~NFSVolumePreunmountEnter() = default;
-
-std::shared_ptr<InputSpec> NFSVolumePreunmountEnter::GetInputSpecInternal()
-{
-    return PreunmountInputSpec("Name of the NAS volume to enter preunmount state.");
-}
-
-std::shared_ptr<OutputSpec> NFSVolumePreunmountEnter::GetOutputSpecInternal() { return BooleanOutputSpec(); }
-
-void NFSVolumePreunmountEnter::ExecuteInternal(const InputPtr& in, const OutputPtr& out)
-{
-    ChangePreunmountState(in, out, &StorageInfoImpl::EnterNetworkFileSystemPreUnmount, "Preunmount Enter failed for ");
-}
-
-std::shared_ptr<NFSVolumePreunmountExit> NFSVolumePreunmountExit::New()
-{
-    return std::make_shared<NFSVolumePreunmountExit>();
-}
-
-NFSVolumePreunmountExit::NFSVolumePreunmountExit() { SetDescription("Exit NAS volume from preunmount state."); }
-
-NFSVolumePreunmountExit::~NFSVolumePreunmountExit() = default;
-
-std::shared_ptr<InputSpec> NFSVolumePreunmountExit::GetInputSpecInternal()
-{
-    return PreunmountInputSpec("Name of the NAS volume to exit from preunmount state.");
-}
-
-std::shared_ptr<OutputSpec> NFSVolumePreunmountExit::GetOutputSpecInternal() { return BooleanOutputSpec(); }
-
-void NFSVolumePreunmountExit::ExecuteInternal(const InputPtr& in, const OutputPtr& out)
-{
-    ChangePreunmountState(in, out, &StorageInfoImpl::ExitNetworkFileSystemPreUnmount, "Preunmount Exit failed for ");
-}
+NodePtr NewNFSVolumePreunmountEnter() { return New<NFSVolumePreunmountEnter>(); }
+NodePtr NewNFSVolumePreunmountExit() { return New<NFSVolumePreunmountExit>(); }
 
 } // namespace OrvaneCli::FileSystem

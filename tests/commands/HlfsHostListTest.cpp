@@ -6,7 +6,7 @@
 
 #include <gtest/gtest.h>
 
-#include "hlfs/HLFSVolumeHostList.h"
+#include "hlfs/Manifest.h"
 
 using namespace OrvaneCli::FileSystem;
 
@@ -31,11 +31,11 @@ TEST(HlfsHostListTest, StatusByVolumeModeAndHostMode)
     };
     for (const auto& c : cases) {
         SCOPED_TRACE(c.volumeMode);
-        EXPECT_STREQ(HLFSVolumeHostList::TranslateStatus(c.volumeMode, 4), c.atsHost);
-        EXPECT_STREQ(HLFSVolumeHostList::TranslateStatus(c.volumeMode, 0), c.otherHost);
+        EXPECT_STREQ(TranslateStatus(c.volumeMode, 4), c.atsHost);
+        EXPECT_STREQ(TranslateStatus(c.volumeMode, 0), c.otherHost);
         // The status tests the bit of value 4, not equality.
-        EXPECT_STREQ(HLFSVolumeHostList::TranslateStatus(c.volumeMode, 6), c.atsHost);
-        EXPECT_STREQ(HLFSVolumeHostList::TranslateStatus(c.volumeMode, 0xFB), c.otherHost);
+        EXPECT_STREQ(TranslateStatus(c.volumeMode, 6), c.atsHost);
+        EXPECT_STREQ(TranslateStatus(c.volumeMode, 0xFB), c.otherHost);
     }
 }
 

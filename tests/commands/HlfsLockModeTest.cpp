@@ -7,7 +7,7 @@
 
 #include <gtest/gtest.h>
 
-#include "hlfs/HLFSVolumeLockMode.h"
+#include "hlfs/Manifest.h"
 
 using namespace OrvaneCli::FileSystem;
 
@@ -20,6 +20,6 @@ TEST(HlfsLockModeTest, LockModeTextTakesTheFirstSetBit)
         {0x40, "ATS DOWNGRADE PENDING"}, {0x4F, "ATS DOWNGRADE PENDING"},
     };
     for (const auto& [mode, text] : cases) {
-        EXPECT_EQ(HLFSVolumeLockModeList::TranslateLockMode(mode), text) << std::hex << mode;
+        EXPECT_EQ(TranslateLockMode(mode), text) << std::hex << mode;
     }
 }

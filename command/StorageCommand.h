@@ -1,0 +1,76 @@
+#pragma once
+
+// The base of every storage command: what a command declares about itself (description,
+// default formatter, examples, result) is given once to the constructor; the command adds
+// its parameters and runs.
+
+#include <memory>
+#include <utility>
+#include <vector>
+
+#include "command/Columns.h"
+#include "command/Command.h"
+
+namespace OrvaneCli::FileSystem {
+
+struct Example {
+    const char* arguments;
+    const char* description;
+};
+
+// What a command's result is: true on success, or rows (or one structure) of a column table.
+struct ResultDecl {
+    enum Kind { Boolean, List, Single };
+    Kind kind = Boolean;
+    const ColumnTable* table = nullptr;
+};
+inline ResultDecl ListOf(const ColumnTable& table) { return {ResultDecl::List, &table}; }
+inline ResultDecl One(const ColumnTable& table) { return {ResultDecl::Single, &table}; }
+
+struct CommandDecl {
+    const char* description;
+    ResultDecl result = {};
+    const char* formatter = nullptr; // the default formatter, if any
+    std::vector<Example> examples = {};
+};
+
+class StorageCommand : public Command {
+protected:
+    explicit StorageCommand(CommandDecl decl);
+
+    // Adds the command's parameters, in the order help shows them.
+    virtual void DeclareParameters(const std::shared_ptr<InputSpec>& inputs);
+    virtual void Run(const InputPtr& in, const OutputPtr& out) = 0;
+
+    // The shape of the result's rows as the switches are now.
+    RowShape Rows() const { return decl_.result.table->Shape(); }
+
+private:
+    std::shared_ptr<InputSpec> GetInputSpecInternal() final;
+    std::shared_ptr<OutputSpec> GetOutputSpecInternal() final;
+    void ExecuteInternal(const InputPtr& in, const OutputPtr& out) final;
+
+    CommandDecl decl_;
+};
+
+// A command that makes one StorageInfoImpl call and is true when it returns.
+class HostActionCommand : public StorageCommand {
+protected:
+    using Action = void (*)(StorageInfoImpl& storage);
+    HostActionCommand(const char* description, Action action, StorageInfoPlacement placement);
+
+private:
+    void Run(const InputPtr& in, const OutputPtr& out) final;
+
+    Action action_;
+    StorageInfoPlacement placement_;
+};
+
+// Makes a command for the tree.
+template <typename Leaf>
+std::shared_ptr<Command> New()
+{
+    return std::make_shared<Leaf>();
+}
+
+} // namespace OrvaneCli::FileSystem

@@ -1,0 +1,81 @@
+#include "command/Selection.h"
+#include "command/StorageCommand.h"
+#include "hlfs/Manifest.h"
+#include "hlfs/SnapshotCommon.h"
+
+namespace OrvaneCli::FileSystem {
+
+namespace {
+
+const char* const kVolumeName = "Volume Name";
+const char* const kHlfsUuid = "HLFS UUID";
+const char* const kLvmUuid = "LVM UUID";
+const char* const kExtentNumber = "Extent Number";
+const char* const kDeviceName = "Device Name";
+const char* const kPartition = "Partition";
+const char* const kStart = "Start";
+const char* const kEnd = "End";
+
+const ColumnTable kColumns("HLFSSnapshotExtent", {
+                                                     {kVolumeName, ColumnType::String},
+                                                     {kHlfsUuid, ColumnType::String},
+                                                     {.title = kLvmUuid, .type = ColumnType::String, .shown = false},
+                                                     {kExtentNumber, ColumnType::Int},
+                                                     {kDeviceName, ColumnType::String},
+                                                     {kPartition, ColumnType::Int},
+                                                     {kStart, ColumnType::Int},
+                                                     {kEnd, ColumnType::Int},
+                                                 });
+
+// storage hlfs snapshot extent list
+class HLFSSnapshotExtentList final : public StorageCommand {
+public:
+    HLFSSnapshotExtentList()
+        : StorageCommand({"List extents of unresolved snapshots/replicas of HLFS volume.", ListOf(kColumns), "table"})
+    {
+    }
+
+private:
+    void DeclareParameters(const std::shared_ptr<InputSpec>& inputs) override
+    {
+        AddLabelAndUuid(inputs, "The HLFS volume label of the target snapshot to enumerate.",
+                        "The HLFS volume uuid of the target snapshot to enumerate.");
+    }
+
+    void Run(const InputPtr& in, const OutputPtr& out) override
+    {
+        const RowShape shape = Rows();
+        auto list = shape.EmptyList();
+        // Outer scope: a failure listing the copies, their extents or the selection ends the walk.
+        ForEachSelectedSnapshot(in, out, [&](UnresolvedHlfsVolumeImpl& volume) {
+            const auto extents = volume.GetExtents();
+            // Inner scope: a failure on one extent drops the rest of this copy's extents only.
+            Guarded(out, [&] {
+                // The number is the position in the host's vector, so skipped entries still count.
+                for (std::size_t index = 0; index < extents.size(); ++index) {
+                    UnresolvedHlfsExtentImpl* extent = AsSnapshotExtent(extents[index]);
+                    if (extent == nullptr) {
+                        continue;
+                    }
+                    auto row = shape.NewRow();
+                    row.Set(kVolumeName, volume.GetVolumeName());
+                    row.Set(kHlfsUuid, volume.GetUuid());
+                    row.Set(kLvmUuid, volume.GetLvmUuid());
+                    row.Set(kExtentNumber, static_cast<long>(index));
+                    row.Set(kDeviceName, extent->GetDeviceName());
+                    row.Set(kPartition, static_cast<int>(extent->GetPartition()));
+                    row.Set(kStart, static_cast<long>(extent->GetStart()));
+                    row.Set(kEnd, static_cast<long>(extent->GetEnd()));
+                    list->Add(row.Structure());
+                }
+            });
+        });
+        out->SetRootObject(list);
+    }
+};
+
+} // namespace
+
+NodePtr NewHLFSSnapshotExtentList() { return New<HLFSSnapshotExtentList>(); }
+
+} // namespace OrvaneCli::FileSystem
