@@ -1,19 +1,27 @@
 #include "command/Columns.h"
 
-#include <cstring>
 #include <stdexcept>
 
 namespace OrvaneCli::FileSystem {
 
 namespace {
 
-bool Present(const Column& column) { return !column.feature || IsFeatureEnabled(*column.feature); }
+bool Present(const Column& column)
+{
+    return !column.options.feature || IsFeatureEnabled(*column.options.feature);
+}
 
 } // namespace
 
 ColumnTable::ColumnTable(const char* structure, std::vector<Column> columns, bool fieldsHint, const char* header)
     : structure_(structure), columns_(std::move(columns)), fieldsHint_(fieldsHint), header_(header)
 {
+    for (std::size_t i = 0; i < columns_.size(); ++i) {
+        if (columns_[i].field != static_cast<int>(i)) {
+            throw std::logic_error(std::string("column '") + columns_[i].title + "' of " + structure +
+                                   " is not at the place its field number says");
+        }
+    }
 }
 
 RowShape ColumnTable::Shape() const
@@ -34,15 +42,16 @@ void ColumnTable::DeclareHints(CommandSpec& command) const
     std::vector<std::string> view;
     std::vector<const Column*> placedLater;
     for (const Column* column : shape.columns_) {
-        if (column->shown && column->shownAfter == nullptr) {
+        if (column->options.shown && column->options.shownAfter < 0) {
             view.emplace_back(column->title);
-        } else if (column->shown) {
+        } else if (column->options.shown) {
             placedLater.push_back(column);
         }
     }
     for (const Column* column : placedLater) {
+        const char* after = columns_.at(static_cast<std::size_t>(column->options.shownAfter)).title;
         auto anchor = view.begin();
-        while (anchor != view.end() && *anchor != column->shownAfter) {
+        while (anchor != view.end() && *anchor != after) {
             ++anchor;
         }
         if (anchor == view.end()) {
@@ -57,16 +66,17 @@ void ColumnTable::DeclareHints(CommandSpec& command) const
         command.SetDefaultOutputParameter(std::string("header:") + structure_, header_);
     }
     for (const Column* column : shape.columns_) {
-        if (column->unit != nullptr) {
-            command.SetDefaultOutputParameter(std::string("units:") + structure_ + "." + column->title, column->unit);
+        if (column->options.unit != nullptr) {
+            command.SetDefaultOutputParameter(std::string("units:") + structure_ + "." + column->title,
+                                              column->options.unit);
         }
     }
 }
 
-const Column* RowShape::Find(const char* title) const
+const Column* RowShape::Find(int field) const
 {
     for (const Column* column : columns_) {
-        if (std::strcmp(column->title, title) == 0) {
+        if (column->field == field) {
             return column;
         }
     }
@@ -94,33 +104,34 @@ std::shared_ptr<MetaStruct> RowShape::Empty() const
 
 std::shared_ptr<MetaList> RowShape::EmptyList() const { return MetaList::New(MetaType::Struct, Empty()); }
 
-const Column& Row::Expect(const char* title, ColumnType type) const
+const Column& Row::Expect(int field, ColumnType type) const
 {
-    const Column* column = shape_->Find(title);
+    const Column* column = shape_->Find(field);
     if (column == nullptr) {
-        throw std::logic_error(std::string("field '") + title + "' is not a column of this result");
+        throw std::logic_error("field " + std::to_string(field) + " is not a column of " + structure_->GetName() +
+                               " as the switches are");
     }
     if (column->type != type) {
-        throw std::logic_error(std::string("field '") + title + "' is given a value of another type");
+        throw std::logic_error(std::string("field '") + column->title + "' is given a value of another type");
     }
     return *column;
 }
 
-Row& Row::Set(const char* title, bool value)
+Row& Row::Set(int field, bool value)
 {
-    structure_->SetField(Expect(title, ColumnType::Bool).title, value);
+    structure_->SetField(Expect(field, ColumnType::Bool).title, value);
     return *this;
 }
 
-Row& Row::Set(const char* title, long value)
+Row& Row::Set(int field, long value)
 {
-    structure_->SetField(Expect(title, ColumnType::Int).title, value);
+    structure_->SetField(Expect(field, ColumnType::Int).title, value);
     return *this;
 }
 
-Row& Row::Set(const char* title, const std::string& value)
+Row& Row::Set(int field, const std::string& value)
 {
-    structure_->SetField(Expect(title, ColumnType::String).title, value);
+    structure_->SetField(Expect(field, ColumnType::String).title, value);
     return *this;
 }
 

@@ -15,20 +15,28 @@ namespace OrvaneCli::FileSystem {
 
 enum class ColumnType { String, Int, Bool };
 
+struct ColumnOptions {
+    const char* unit = nullptr;                    // the "units:" hint, if any
+    bool shown = true;                             // part of the default view ("fields:" hint)
+    std::optional<Feature> feature = std::nullopt; // the column exists only while this switch is on
+    int shownAfter = -1;                           // in the default view, placed right after this field
+};
+
+// One column. `field` is the command's own number for it (an enumerator), which is also its
+// position in the table: commands fill rows by these numbers, never by title.
 struct Column {
+    int field;
     const char* title;
     ColumnType type;
-    const char* unit = nullptr;     // the "units:" hint, if any
-    bool shown = true;              // part of the default view ("fields:" hint)
-    std::optional<Feature> feature = std::nullopt; // the column exists only while this switch is on
-    const char* shownAfter = nullptr; // in the default view, placed right after this title
+    ColumnOptions options = {};
 };
 
 class RowShape;
 
 class ColumnTable {
 public:
-    // `fieldsHint`: declare the default view; `header`: the "header:" hint, if any.
+    // `fieldsHint`: declare the default view; `header`: the "header:" hint, if any. A column
+    // out of its place throws std::logic_error.
     ColumnTable(const char* structure, std::vector<Column> columns, bool fieldsHint = true, const char* header = nullptr);
 
     const char* Structure() const { return structure_; }
@@ -48,18 +56,18 @@ private:
 // another type, is a programming error and throws std::logic_error.
 class Row {
 public:
-    Row& Set(const char* title, bool value);
-    Row& Set(const char* title, long value);
-    Row& Set(const char* title, int value) { return Set(title, static_cast<long>(value)); }
-    Row& Set(const char* title, const std::string& value);
-    Row& Set(const char* title, const char* value) { return Set(title, std::string(value)); }
+    Row& Set(int field, bool value);
+    Row& Set(int field, long value);
+    Row& Set(int field, int value) { return Set(field, static_cast<long>(value)); }
+    Row& Set(int field, const std::string& value);
+    Row& Set(int field, const char* value) { return Set(field, std::string(value)); }
 
     const std::shared_ptr<MetaStruct>& Structure() const { return structure_; }
 
 private:
     friend class RowShape;
     Row(const RowShape& shape, std::shared_ptr<MetaStruct> structure) : shape_(&shape), structure_(std::move(structure)) {}
-    const Column& Expect(const char* title, ColumnType type) const;
+    const Column& Expect(int field, ColumnType type) const;
 
     const RowShape* shape_;
     std::shared_ptr<MetaStruct> structure_;
@@ -70,8 +78,8 @@ public:
     // A structure holding every column of the shape at its empty value.
     std::shared_ptr<MetaStruct> Empty() const;
     Row NewRow() const { return Row(*this, Empty()); }
-    bool Has(const char* title) const { return Find(title) != nullptr; }
-    const Column* Find(const char* title) const;
+    bool Has(int field) const { return Find(field) != nullptr; }
+    const Column* Find(int field) const;
     // An empty list of rows of this shape.
     std::shared_ptr<MetaList> EmptyList() const;
     // The columns in structure order.

@@ -30,7 +30,9 @@ std::shared_ptr<ParameterSpec> MakeParameter(const ParameterDecl& decl)
 
 void AddParameter(const std::shared_ptr<InputSpec>& inputs, const ParameterDecl& decl)
 {
-    inputs->AddParameter(MakeParameter(decl));
+    if (!decl.feature || IsFeatureEnabled(*decl.feature)) {
+        inputs->AddParameter(MakeParameter(decl));
+    }
 }
 
 std::shared_ptr<ParameterConstraint> IntRange(long min, long max)

@@ -6,6 +6,7 @@
 #include <cstdint>
 #include <initializer_list>
 #include <memory>
+#include <optional>
 #include <string>
 #include <utility>
 #include <vector>
@@ -75,6 +76,7 @@ struct ParameterDecl {
     const char* description;
     bool required = false;
     std::shared_ptr<ParameterConstraint> constraint = nullptr;
+    std::optional<Feature> feature = std::nullopt; // declared only while this switch is on
 };
 
 std::shared_ptr<ParameterSpec> MakeParameter(const ParameterDecl& decl);

@@ -13,18 +13,25 @@ const VolumeSelectorTexts kHlfsVolumeTexts = {
 
 } // namespace
 
-std::shared_ptr<ParameterSpec> IgnoreErrorInputParameter()
+ParameterDecl LabelParameter(const char* description, ParameterType type)
 {
-    return MakeParameter({kOptionIgnoreErrors, "i", ParameterType::Flag,
-                          "Ignore errors encountered (if any) while retrieving information for each file system."});
+    return {kOptionVolumeLabel, "l", type, description};
 }
 
-void AddLabelAndUuid(const std::shared_ptr<InputSpec>& inputs, const char* labelDescription,
-                     const char* uuidDescription, ParameterType type)
+ParameterDecl UuidParameter(const char* description, ParameterType type)
 {
-    AddParameter(inputs, {kOptionVolumeLabel, "l", type, labelDescription});
-    AddParameter(inputs, {kOptionVolumeUuid, "u", type, uuidDescription});
+    return {kOptionVolumeUuid, "u", type, description};
 }
+
+ParameterDecl IgnoreErrorsParameter()
+{
+    return {kOptionIgnoreErrors, "i", ParameterType::Flag,
+            "Ignore errors encountered (if any) while retrieving information for each file system."};
+}
+
+ParameterDecl HlfsLabelParameter() { return LabelParameter("The label of the target HLFS volume."); }
+
+ParameterDecl HlfsUuidParameter() { return UuidParameter("The uuid of the target HLFS volume."); }
 
 std::optional<std::size_t> ExactlyOneOf(std::initializer_list<Choice> choices, const char* none, const OutputPtr& out)
 {
@@ -60,11 +67,6 @@ std::optional<VolumeChoice> ChooseVolume(const InputPtr& in, const VolumeSelecto
 std::string VolumeNotFound(const VolumeChoice& choice, const VolumeSelectorTexts& texts)
 {
     return HostCtl::Misc::StrPrintf(choice.ByUuid() ? texts.uuidNotFound : texts.labelNotFound, choice.value.c_str());
-}
-
-void AddSingleHLFSVolumeParameters(const std::shared_ptr<InputSpec>& inputs)
-{
-    AddLabelAndUuid(inputs, "The label of the target HLFS volume.", "The uuid of the target HLFS volume.");
 }
 
 std::unique_ptr<HlFileSystem> GetSingleHLFSVolume(const InputPtr& in, const OutputPtr& out)

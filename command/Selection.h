@@ -14,12 +14,14 @@
 
 namespace OrvaneCli::FileSystem {
 
-// The `ignore-errors` flag of the listings.
-std::shared_ptr<ParameterSpec> IgnoreErrorInputParameter();
-
-// Adds `volume-label` (-l) then `volume-uuid` (-u), with the command's own wording.
-void AddLabelAndUuid(const std::shared_ptr<InputSpec>& inputs, const char* labelDescription,
-                     const char* uuidDescription, ParameterType type = ParameterType::String);
+// `volume-label` (-l) and `volume-uuid` (-u), with the command's own wording.
+ParameterDecl LabelParameter(const char* description, ParameterType type = ParameterType::String);
+ParameterDecl UuidParameter(const char* description, ParameterType type = ParameterType::String);
+// The flag `ignore-errors` (-i) of the listings.
+ParameterDecl IgnoreErrorsParameter();
+// `volume-label` and `volume-uuid` as GetSingleHLFSVolume reads them.
+ParameterDecl HlfsLabelParameter();
+ParameterDecl HlfsUuidParameter();
 
 // One way of naming what a command acts on. `conflict` is the message for giving it together
 // with any later choice of the same list.
@@ -71,8 +73,6 @@ auto FindVolume(const VolumeChoice& choice, const VolumeSelectorTexts& texts, co
 // The HLFS volume named by volume-label or volume-uuid, looked up in the guarded region.
 // An empty pointer means failure; the reason is already on `out`.
 std::unique_ptr<HlFileSystem> GetSingleHLFSVolume(const InputPtr& in, const OutputPtr& out);
-// Adds the two parameters GetSingleHLFSVolume reads.
-void AddSingleHLFSVolumeParameters(const std::shared_ptr<InputSpec>& inputs);
 
 // How a listing reports a volume it passes over: "<prefix><name>': <host message>, skipping.".
 // The name is read only after the failure; if that fails too, the failure leaves the walk.

@@ -13,7 +13,12 @@ StorageCommand::StorageCommand(CommandDecl decl) : decl_(std::move(decl))
     }
 }
 
-void StorageCommand::DeclareParameters(const std::shared_ptr<InputSpec>&) {}
+void StorageCommand::DeclareParameters(const std::shared_ptr<InputSpec>& inputs)
+{
+    for (const ParameterDecl& parameter : decl_.parameters) {
+        AddParameter(inputs, parameter);
+    }
+}
 
 std::shared_ptr<InputSpec> StorageCommand::GetInputSpecInternal()
 {

@@ -32,13 +32,15 @@ struct CommandDecl {
     ResultDecl result = {};
     const char* formatter = nullptr; // the default formatter, if any
     std::vector<Example> examples = {};
+    std::vector<ParameterDecl> parameters = {}; // in the order help shows them
 };
 
 class StorageCommand : public Command {
 protected:
     explicit StorageCommand(CommandDecl decl);
 
-    // Adds the command's parameters, in the order help shows them.
+    // Adds the command's parameters: those of its declaration, unless it decides them afresh
+    // (from the feature switches) at every call.
     virtual void DeclareParameters(const std::shared_ptr<InputSpec>& inputs);
     virtual void Run(const InputPtr& in, const OutputPtr& out) = 0;
 

@@ -8,22 +8,16 @@ namespace {
 
 using HostFileSystem = HostCtl::Storage::FileSystem;
 
-const char* const kMountPoint = "Mount Point";
-const char* const kVolumeName = "Volume Name";
-const char* const kUuid = "UUID";
-const char* const kType = "Type";
-const char* const kMounted = "Mounted";
-const char* const kSize = "Size";
-const char* const kFree = "Free";
+enum Field { kMountPoint, kVolumeName, kUuid, kType, kMounted, kSize, kFree };
 
 const ColumnTable kColumns("FilesystemVolume", {
-                                                   {kMountPoint, ColumnType::String},
-                                                   {kVolumeName, ColumnType::String},
-                                                   {kUuid, ColumnType::String},
-                                                   {kType, ColumnType::String},
-                                                   {.title = kMounted, .type = ColumnType::Bool, .shownAfter = kUuid},
-                                                   {kSize, ColumnType::Int},
-                                                   {kFree, ColumnType::Int},
+                                                   {kMountPoint, "Mount Point", ColumnType::String},
+                                                   {kVolumeName, "Volume Name", ColumnType::String},
+                                                   {kUuid, "UUID", ColumnType::String},
+                                                   {kType, "Type", ColumnType::String},
+                                                   {kMounted, "Mounted", ColumnType::Bool, {.shownAfter = kUuid}},
+                                                   {kSize, "Size", ColumnType::Int},
+                                                   {kFree, "Free", ColumnType::Int},
                                                });
 
 const char* const kUuidParameter = "uuid";
@@ -32,19 +26,19 @@ const char* const kUuidParameter = "uuid";
 class VolumeList final : public StorageCommand {
 public:
     VolumeList()
-        : StorageCommand({"List the volumes available to the host. This includes HLFS, NAS, VFAT and UFS partitions.",
-                          ListOf(kColumns), "table"})
+        : StorageCommand({
+              .description =
+                  "List the volumes available to the host. This includes HLFS, NAS, VFAT and UFS partitions.",
+              .result = ListOf(kColumns),
+              .formatter = "table",
+              .parameters = {{kUuidParameter, "u", ParameterType::String,
+                              "Only show information for the filesystem with the specified UUID."},
+                             IgnoreErrorsParameter()},
+          })
     {
     }
 
 private:
-    void DeclareParameters(const std::shared_ptr<InputSpec>& inputs) override
-    {
-        AddParameter(inputs, {kUuidParameter, "u", ParameterType::String,
-                              "Only show information for the filesystem with the specified UUID."});
-        inputs->AddParameter(IgnoreErrorInputParameter());
-    }
-
     void Run(const InputPtr& in, const OutputPtr& out) override
     {
         // Asking for the mount point may fail again; that failure ends the walk through the

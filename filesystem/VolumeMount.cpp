@@ -19,20 +19,23 @@ const VolumeSelectorTexts kTexts = {
 // storage filesystem mount
 class VolumeMount final : public StorageCommand {
 public:
-    VolumeMount() : StorageCommand({"Connect to and mount an unmounted volume on the Zephal host."}) {}
-
-private:
-    void DeclareParameters(const std::shared_ptr<InputSpec>& inputs) override
+    VolumeMount()
+        : StorageCommand({
+              .description = "Connect to and mount an unmounted volume on the Zephal host.",
+              .parameters =
+                  {
+                      LabelParameter("The label of the volume to mount. This volume must be unmounted for this "
+                                     "operation to succeed."),
+                      UuidParameter("The UUID of the HLFS filesystem to mount. This volume must be unmounted for "
+                                    "this operation to succeed."),
+                      {kOptionNoPersist, "n", ParameterType::Flag,
+                       "Mount the volume non-persistently; the volume will not be mounted after a restart."},
+                  },
+          })
     {
-        AddLabelAndUuid(inputs,
-                        "The label of the volume to mount. This volume must be unmounted for this operation to "
-                        "succeed.",
-                        "The UUID of the HLFS filesystem to mount. This volume must be unmounted for this operation "
-                        "to succeed.");
-        AddParameter(inputs, {kOptionNoPersist, "n", ParameterType::Flag,
-                              "Mount the volume non-persistently; the volume will not be mounted after a restart."});
     }
 
+private:
     void Run(const InputPtr& in, const OutputPtr& out) override
     {
         const std::string uuid = in->GetParameter(kOptionVolumeUuid);

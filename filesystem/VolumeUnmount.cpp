@@ -149,22 +149,24 @@ void UnmountAllHlfs(StorageInfoImpl& storage, FileSystem::MountOperationOption o
 class VolumeUnmount final : public StorageCommand {
 public:
     VolumeUnmount()
-        : StorageCommand({"Disconnect and unmount and existing HLFS or NAS volume. This will not delete the "
-                          "configuration for the volume, but will remove the volume from the list of mounted volumes."})
+        : StorageCommand({
+              .description = "Disconnect and unmount and existing HLFS or NAS volume. This will not delete the "
+                             "configuration for the volume, but will remove the volume from the list of mounted "
+                             "volumes.",
+              .parameters =
+                  {
+                      LabelParameter("The label of the volume to unmount."),
+                      {kVolumePath, "p", ParameterType::String, "The path of the volume to unmount."},
+                      UuidParameter("The uuid of the volume to unmount."),
+                      {kOptionNoPersist, "n", ParameterType::Flag,
+                       "Unmount the volume non-persistently; the volume will be automounted after a restart."},
+                      {kUnmountAllHlfs, "a", ParameterType::Flag, "Unmount all hlfs volumes."},
+                  },
+          })
     {
     }
 
 private:
-    void DeclareParameters(const std::shared_ptr<InputSpec>& inputs) override
-    {
-        AddParameter(inputs, {kOptionVolumeLabel, "l", ParameterType::String, "The label of the volume to unmount."});
-        AddParameter(inputs, {kVolumePath, "p", ParameterType::String, "The path of the volume to unmount."});
-        AddParameter(inputs, {kOptionVolumeUuid, "u", ParameterType::String, "The uuid of the volume to unmount."});
-        AddParameter(inputs, {kOptionNoPersist, "n", ParameterType::Flag,
-                              "Unmount the volume non-persistently; the volume will be automounted after a restart."});
-        AddParameter(inputs, {kUnmountAllHlfs, "a", ParameterType::Flag, "Unmount all hlfs volumes."});
-    }
-
     void Run(const InputPtr& in, const OutputPtr& out) override
     {
         const std::string label = in->GetParameter(kOptionVolumeLabel);

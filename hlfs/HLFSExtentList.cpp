@@ -6,37 +6,32 @@ namespace OrvaneCli::FileSystem {
 
 namespace {
 
-const char* const kVolumeName = "Volume Name";
-const char* const kHlfsUuid = "HLFS UUID";
-const char* const kLvmUuid = "LVM UUID";
-const char* const kDeviceName = "Device Name";
-const char* const kPartition = "Partition";
-const char* const kExtentNumber = "Extent Number";
+enum Field { kVolumeName, kHlfsUuid, kLvmUuid, kDeviceName, kPartition, kExtentNumber };
 
 const ColumnTable kColumns("FilesystemHLFSExtents",
                            {
-                               {kVolumeName, ColumnType::String},
-                               {kHlfsUuid, ColumnType::String},
-                               {.title = kLvmUuid, .type = ColumnType::String, .shown = false},
-                               {kDeviceName, ColumnType::String},
-                               {kPartition, ColumnType::Int},
-                               {.title = kExtentNumber, .type = ColumnType::Int, .shownAfter = kHlfsUuid},
+                               {kVolumeName, "Volume Name", ColumnType::String},
+                               {kHlfsUuid, "HLFS UUID", ColumnType::String},
+                               {kLvmUuid, "LVM UUID", ColumnType::String, {.shown = false}},
+                               {kDeviceName, "Device Name", ColumnType::String},
+                               {kPartition, "Partition", ColumnType::Int},
+                               {kExtentNumber, "Extent Number", ColumnType::Int, {.shownAfter = kHlfsUuid}},
                            });
 
 // storage hlfs extent list
 class HLFSExtentList final : public StorageCommand {
 public:
     HLFSExtentList()
-        : StorageCommand({"List the HLFS extents available on the host.", ListOf(kColumns), "table"})
+        : StorageCommand({
+              .description = "List the HLFS extents available on the host.",
+              .result = ListOf(kColumns),
+              .formatter = "table",
+              .parameters = {IgnoreErrorsParameter()},
+          })
     {
     }
 
 private:
-    void DeclareParameters(const std::shared_ptr<InputSpec>& inputs) override
-    {
-        inputs->AddParameter(IgnoreErrorInputParameter());
-    }
-
     // One row per extent, grouped by volume in the host's order and numbered from 0 within each
     // volume; empty extents are neither shown nor counted. A volume whose reading fails keeps
     // the rows it already gave.

@@ -16,17 +16,30 @@ namespace {
 constexpr const char* kHlfsHeapName = "hlfs3";
 
 // The result's fields, in structure order, with the unit each value is shown in.
+enum Field {
+    kMissRatio,
+    kCacheSize,
+    kCacheSizeMax,
+    kCacheUsage,
+    kWorkingSet,
+    kWorkingSetMax,
+    kHeapOverhead,
+    kHeapSize,
+    kHeapSizeMax,
+    kFieldCount
+};
+
 const ColumnTable kColumns("HLFSPBCacheGet",
                            {
-                               {.title = "Cache Capacity Miss Ratio", .type = ColumnType::Int, .unit = "%"},
-                               {.title = "Cache Size", .type = ColumnType::Int, .unit = "MiB"},
-                               {.title = "Cache Size Max", .type = ColumnType::Int, .unit = "MiB"},
-                               {.title = "Cache Usage", .type = ColumnType::Int, .unit = "%"},
-                               {.title = "Cache Working Set", .type = ColumnType::Int, .unit = "TiB"},
-                               {.title = "Cache Working Set Max", .type = ColumnType::Int, .unit = "TiB"},
-                               {.title = "Hlfs Heap Overhead", .type = ColumnType::Int, .unit = "KiB"},
-                               {.title = "Hlfs Heap Size", .type = ColumnType::Int, .unit = "MiB"},
-                               {.title = "Hlfs Heap Size Max", .type = ColumnType::Int, .unit = "MiB"},
+                               {kMissRatio, "Cache Capacity Miss Ratio", ColumnType::Int, {.unit = "%"}},
+                               {kCacheSize, "Cache Size", ColumnType::Int, {.unit = "MiB"}},
+                               {kCacheSizeMax, "Cache Size Max", ColumnType::Int, {.unit = "MiB"}},
+                               {kCacheUsage, "Cache Usage", ColumnType::Int, {.unit = "%"}},
+                               {kWorkingSet, "Cache Working Set", ColumnType::Int, {.unit = "TiB"}},
+                               {kWorkingSetMax, "Cache Working Set Max", ColumnType::Int, {.unit = "TiB"}},
+                               {kHeapOverhead, "Hlfs Heap Overhead", ColumnType::Int, {.unit = "KiB"}},
+                               {kHeapSize, "Hlfs Heap Size", ColumnType::Int, {.unit = "MiB"}},
+                               {kHeapSizeMax, "Hlfs Heap Size Max", ColumnType::Int, {.unit = "MiB"}},
                            },
                            false);
 
@@ -36,7 +49,7 @@ constexpr unsigned kKiB = 10;
 
 // The values of the columns, in the same order: whole units, truncated. The host's
 // figures are unsigned 64-bit; the fields hold 32-bit integers.
-std::array<int, 9> CacheFieldValues(const PointerBlockCacheStats& stats, const HeapRecord& heap)
+std::array<int, kFieldCount> CacheFieldValues(const PointerBlockCacheStats& stats, const HeapRecord& heap)
 {
     // An empty maximum has no usage to speak of (and must not be divided by).
     const std::uint64_t usage = stats.cacheSizeMax == 0 ? 0 : stats.cacheSize * 100 / stats.cacheSizeMax;
@@ -56,7 +69,14 @@ std::array<int, 9> CacheFieldValues(const PointerBlockCacheStats& stats, const H
 // storage hlfs pbcache get
 class HLFSPBCacheGet final : public StorageCommand {
 public:
-    HLFSPBCacheGet() : StorageCommand({"Get HLFS Pointer Block cache statistics.", One(kColumns), "simple"}) {}
+    HLFSPBCacheGet()
+        : StorageCommand({
+              .description = "Get HLFS Pointer Block cache statistics.",
+              .result = One(kColumns),
+              .formatter = "simple",
+          })
+    {
+    }
 
 private:
     void Run(const InputPtr&, const OutputPtr& out) override
@@ -76,9 +96,9 @@ private:
 
             const RowShape shape = Rows();
             auto structure = shape.NewRow();
-            const std::array<int, 9> values = CacheFieldValues(stats, **heap);
-            for (std::size_t i = 0; i < values.size(); ++i) {
-                structure.Set(shape.Columns().at(i)->title, values[i]);
+            const std::array<int, kFieldCount> values = CacheFieldValues(stats, **heap);
+            for (int field = 0; field < kFieldCount; ++field) {
+                structure.Set(field, values[static_cast<std::size_t>(field)]);
             }
             out->SetRootObject(structure.Structure());
         });

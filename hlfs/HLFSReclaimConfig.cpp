@@ -10,10 +10,7 @@ using HostCtl::Storage::HlfsVolumeUnmapProperty;
 
 namespace {
 
-constexpr const char* kGranularityField = "Reclaim Granularity";
-constexpr const char* kPriorityField = "Reclaim Priority";
-constexpr const char* kMethodField = "Reclaim Method";
-constexpr const char* kBandwidthField = "Reclaim Bandwidth";
+enum Field { kGranularityField, kPriorityField, kMethodField, kBandwidthField };
 
 constexpr const char* kGranularityParameter = "reclaim-granularity";
 constexpr const char* kPriorityParameter = "reclaim-priority";
@@ -29,32 +26,54 @@ constexpr std::int64_t kMinBandwidth = std::numeric_limits<std::int32_t>::min();
 constexpr std::int64_t kMaxBandwidth = std::numeric_limits<std::int32_t>::max();
 
 const ColumnTable kColumns("HlfsReclaim", {
-                                              {.title = kGranularityField, .type = ColumnType::Int, .unit = "Bytes"},
-                                              {kPriorityField, ColumnType::String},
-                                              {kMethodField, ColumnType::String},
-                                              {.title = kBandwidthField, .type = ColumnType::Int, .unit = "MB/s"},
+                                              {kGranularityField, "Reclaim Granularity", ColumnType::Int, {.unit = "Bytes"}},
+                                              {kPriorityField, "Reclaim Priority", ColumnType::String},
+                                              {kMethodField, "Reclaim Method", ColumnType::String},
+                                              {kBandwidthField, "Reclaim Bandwidth", ColumnType::Int, {.unit = "MB/s"}},
                                           });
 
 // storage hlfs reclaim config get
 class HLFSReclaimConfigGet final : public StorageCommand {
 public:
     HLFSReclaimConfigGet()
-        : StorageCommand({"Get space reclamation configuration parameters", One(kColumns), "simple"})
+        : StorageCommand({
+              .description = "Get space reclamation configuration parameters",
+              .result = One(kColumns),
+              .formatter = "simple",
+              .parameters = {HlfsLabelParameter(), HlfsUuidParameter()},
+          })
     {
     }
 
 private:
-    void DeclareParameters(const std::shared_ptr<InputSpec>& inputs) override { AddSingleHLFSVolumeParameters(inputs); }
     void Run(const InputPtr& in, const OutputPtr& out) override;
 };
 
 // storage hlfs reclaim config set
 class HLFSReclaimConfigSet final : public StorageCommand {
 public:
-    HLFSReclaimConfigSet() : StorageCommand({"Set space reclamation configuration parameters"}) {}
+    HLFSReclaimConfigSet()
+        : StorageCommand({
+              .description = "Set space reclamation configuration parameters",
+              .parameters =
+                  {
+                      HlfsLabelParameter(),
+                      HlfsUuidParameter(),
+                      {kGranularityParameter, "g", ParameterType::Int,
+                       "Minimum granularity of automatic space reclamation in bytes"},
+                      {kPriorityParameter, "p", ParameterType::String,
+                       "Priority of automatic space reclamation. Supported options are %ENUM%.", false,
+                       StringEnum({{"none", ""}, {"low", ""}, {"medium", ""}, {"high", ""}})},
+                      {kMethodParameter, "m", ParameterType::String,
+                       "Method of automatic space reclamation.  Supported options are %ENUM%.", false,
+                       StringEnum({{kMethodPriority, ""}, {kMethodFixed, ""}})},
+                      {kBandwidthParameter, "b", ParameterType::Int, "Space reclamation fixed bandwidth (MB/s)"},
+                  },
+          })
+    {
+    }
 
 private:
-    void DeclareParameters(const std::shared_ptr<InputSpec>& inputs) override;
     void Run(const InputPtr& in, const OutputPtr& out) override;
 };
 
@@ -76,20 +95,6 @@ void HLFSReclaimConfigGet::Run(const InputPtr& in, const OutputPtr& out)
         structure.Set(kBandwidthField, static_cast<int>(property.bandwidth));
         out->SetRootObject(structure.Structure());
     });
-}
-
-void HLFSReclaimConfigSet::DeclareParameters(const std::shared_ptr<InputSpec>& inputs)
-{
-    AddSingleHLFSVolumeParameters(inputs);
-    AddParameter(inputs, {kGranularityParameter, "g", ParameterType::Int,
-                        "Minimum granularity of automatic space reclamation in bytes"});
-    AddParameter(inputs, {kPriorityParameter, "p", ParameterType::String,
-                        "Priority of automatic space reclamation. Supported options are %ENUM%.", false,
-                        StringEnum({{"none", ""}, {"low", ""}, {"medium", ""}, {"high", ""}})});
-    AddParameter(inputs, {kMethodParameter, "m", ParameterType::String,
-                        "Method of automatic space reclamation.  Supported options are %ENUM%.", false,
-                        StringEnum({{kMethodPriority, ""}, {kMethodFixed, ""}})});
-    AddParameter(inputs, {kBandwidthParameter, "b", ParameterType::Int, "Space reclamation fixed bandwidth (MB/s)"});
 }
 
 void HLFSReclaimConfigSet::Run(const InputPtr& in, const OutputPtr& out)

@@ -7,41 +7,34 @@ namespace OrvaneCli::FileSystem {
 
 namespace {
 
-const char* const kVolumeName = "Volume Name";
-const char* const kHlfsUuid = "HLFS UUID";
-const char* const kLvmUuid = "LVM UUID";
-const char* const kExtentNumber = "Extent Number";
-const char* const kDeviceName = "Device Name";
-const char* const kPartition = "Partition";
-const char* const kStart = "Start";
-const char* const kEnd = "End";
+enum Field { kVolumeName, kHlfsUuid, kLvmUuid, kExtentNumber, kDeviceName, kPartition, kStart, kEnd };
 
 const ColumnTable kColumns("HLFSSnapshotExtent", {
-                                                     {kVolumeName, ColumnType::String},
-                                                     {kHlfsUuid, ColumnType::String},
-                                                     {.title = kLvmUuid, .type = ColumnType::String, .shown = false},
-                                                     {kExtentNumber, ColumnType::Int},
-                                                     {kDeviceName, ColumnType::String},
-                                                     {kPartition, ColumnType::Int},
-                                                     {kStart, ColumnType::Int},
-                                                     {kEnd, ColumnType::Int},
+                                                     {kVolumeName, "Volume Name", ColumnType::String},
+                                                     {kHlfsUuid, "HLFS UUID", ColumnType::String},
+                                                     {kLvmUuid, "LVM UUID", ColumnType::String, {.shown = false}},
+                                                     {kExtentNumber, "Extent Number", ColumnType::Int},
+                                                     {kDeviceName, "Device Name", ColumnType::String},
+                                                     {kPartition, "Partition", ColumnType::Int},
+                                                     {kStart, "Start", ColumnType::Int},
+                                                     {kEnd, "End", ColumnType::Int},
                                                  });
 
 // storage hlfs snapshot extent list
 class HLFSSnapshotExtentList final : public StorageCommand {
 public:
     HLFSSnapshotExtentList()
-        : StorageCommand({"List extents of unresolved snapshots/replicas of HLFS volume.", ListOf(kColumns), "table"})
+        : StorageCommand({
+              .description = "List extents of unresolved snapshots/replicas of HLFS volume.",
+              .result = ListOf(kColumns),
+              .formatter = "table",
+              .parameters = {LabelParameter("The HLFS volume label of the target snapshot to enumerate."),
+                             UuidParameter("The HLFS volume uuid of the target snapshot to enumerate.")},
+          })
     {
     }
 
 private:
-    void DeclareParameters(const std::shared_ptr<InputSpec>& inputs) override
-    {
-        AddLabelAndUuid(inputs, "The HLFS volume label of the target snapshot to enumerate.",
-                        "The HLFS volume uuid of the target snapshot to enumerate.");
-    }
-
     void Run(const InputPtr& in, const OutputPtr& out) override
     {
         const RowShape shape = Rows();

@@ -7,23 +7,17 @@ namespace OrvaneCli::FileSystem {
 
 namespace {
 
-const char* const kVolumeName = "Volume Name";
-const char* const kHlfsUuid = "HLFS UUID";
-const char* const kCanMount = "Can mount";
-const char* const kMountReason = "Reason for un-mountability";
-const char* const kCanResignature = "Can resignature";
-const char* const kResignatureReason = "Reason for non-resignaturability";
-const char* const kExtentCount = "Unresolved Extent Count";
+enum Field { kVolumeName, kHlfsUuid, kCanMount, kMountReason, kCanResignature, kResignatureReason, kExtentCount };
 
 const ColumnTable kColumns("HLFSSnapshot",
                            {
-                               {kVolumeName, ColumnType::String},
-                               {kHlfsUuid, ColumnType::String},
-                               {kCanMount, ColumnType::Bool},
-                               {kMountReason, ColumnType::String},
-                               {kCanResignature, ColumnType::Bool},
-                               {kResignatureReason, ColumnType::String},
-                               {kExtentCount, ColumnType::Int},
+                               {kVolumeName, "Volume Name", ColumnType::String},
+                               {kHlfsUuid, "HLFS UUID", ColumnType::String},
+                               {kCanMount, "Can mount", ColumnType::Bool},
+                               {kMountReason, "Reason for un-mountability", ColumnType::String},
+                               {kCanResignature, "Can resignature", ColumnType::Bool},
+                               {kResignatureReason, "Reason for non-resignaturability", ColumnType::String},
+                               {kExtentCount, "Unresolved Extent Count", ColumnType::Int},
                            },
                            true, "%HLFS UUID%");
 
@@ -37,17 +31,17 @@ std::string ReasonColumn(bool passed, unsigned code)
 class HLFSSnapshotList final : public StorageCommand {
 public:
     HLFSSnapshotList()
-        : StorageCommand({"List unresolved snapshots/replicas of HLFS volume.", ListOf(kColumns), "simple"})
+        : StorageCommand({
+              .description = "List unresolved snapshots/replicas of HLFS volume.",
+              .result = ListOf(kColumns),
+              .formatter = "simple",
+              .parameters = {LabelParameter("The HLFS volume label of the snapshot to list."),
+                             UuidParameter("The HLFS volume uuid of the snapshot to list.")},
+          })
     {
     }
 
 private:
-    void DeclareParameters(const std::shared_ptr<InputSpec>& inputs) override
-    {
-        AddLabelAndUuid(inputs, "The HLFS volume label of the snapshot to list.",
-                        "The HLFS volume uuid of the snapshot to list.");
-    }
-
     void Run(const InputPtr& in, const OutputPtr& out) override
     {
         const RowShape shape = Rows();

@@ -9,17 +9,21 @@ namespace {
 // storage hlfs snapshot mount
 class HLFSSnapshotMount final : public StorageCommand {
 public:
-    HLFSSnapshotMount() : StorageCommand({"Mount a snapshot/replica of a HLFS volume."}) {}
-
-private:
-    void DeclareParameters(const std::shared_ptr<InputSpec>& inputs) override
+    HLFSSnapshotMount()
+        : StorageCommand({
+              .description = "Mount a snapshot/replica of a HLFS volume.",
+              .parameters =
+                  {
+                      LabelParameter("The HLFS volume label of the snapshot to mount."),
+                      UuidParameter("The HLFS volume uuid of the snapshot to mount."),
+                      {kOptionNoPersist, "n", ParameterType::Flag,
+                       "Mount the volume non-persistently; the volume will not be automounted after a restart."},
+                  },
+          })
     {
-        AddLabelAndUuid(inputs, "The HLFS volume label of the snapshot to mount.",
-                        "The HLFS volume uuid of the snapshot to mount.");
-        AddParameter(inputs, {kOptionNoPersist, "n", ParameterType::Flag,
-                              "Mount the volume non-persistently; the volume will not be automounted after a restart."});
     }
 
+private:
     void Run(const InputPtr& in, const OutputPtr& out) override
     {
         const bool persistent = !in->IsFlagSet(kOptionNoPersist);

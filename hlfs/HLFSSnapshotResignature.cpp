@@ -9,15 +9,14 @@ namespace {
 // storage hlfs snapshot resignature
 class HLFSSnapshotResignature final : public StorageCommand {
 public:
-    HLFSSnapshotResignature() : StorageCommand({"Resignature a snapshot/replica of a HLFS volume."}) {}
-
-private:
-    void DeclareParameters(const std::shared_ptr<InputSpec>& inputs) override
+    HLFSSnapshotResignature()
+        : StorageCommand({.description = "Resignature a snapshot/replica of a HLFS volume.",
+                          .parameters = {LabelParameter("The HLFS volume label of the snapshot to resignature."),
+                                         UuidParameter("The HLFS volume uuid of the snapshot to resignature.")}})
     {
-        AddLabelAndUuid(inputs, "The HLFS volume label of the snapshot to resignature.",
-                        "The HLFS volume uuid of the snapshot to resignature.");
     }
 
+private:
     void Run(const InputPtr& in, const OutputPtr& out) override
     {
         ResolveMatchingSnapshots(in, out, [&](UnresolvedHlfsVolumeImpl& volume) {

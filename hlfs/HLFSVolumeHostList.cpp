@@ -16,50 +16,46 @@ constexpr const char* kUpgradePending = "ATS Upgrade Pending";
 constexpr const char* kDowngradePending = "ATS Downgrade Pending";
 
 const char* const kLiveness = "liveness";
-const char* const kHeartbeatUuid = "Heartbeat UUID";
-const char* const kMacAddress = "MAC Address";
-const char* const kDriverVersion = "Driver Version";
-const char* const kHeartbeatOffset = "Heartbeat Offset";
-const char* const kLockingMode = "Locking Mode";
-const char* const kStatus = "Status";
+enum Field { kHeartbeatUuid, kMacAddress, kDriverVersion, kHeartbeatOffset, kLockingMode, kStatus };
 
 const ColumnTable kColumns("VolumeLockModeInUse", {
-                                                      {kHeartbeatUuid, ColumnType::String},
-                                                      {kMacAddress, ColumnType::String},
-                                                      {kDriverVersion, ColumnType::String},
-                                                      {kHeartbeatOffset, ColumnType::Int},
-                                                      {kLockingMode, ColumnType::String},
-                                                      {kStatus, ColumnType::String},
+                                                      {kHeartbeatUuid, "Heartbeat UUID", ColumnType::String},
+                                                      {kMacAddress, "MAC Address", ColumnType::String},
+                                                      {kDriverVersion, "Driver Version", ColumnType::String},
+                                                      {kHeartbeatOffset, "Heartbeat Offset", ColumnType::Int},
+                                                      {kLockingMode, "Locking Mode", ColumnType::String},
+                                                      {kStatus, "Status", ColumnType::String},
                                                   });
 
 // storage hlfs host list
 class HLFSVolumeHostList final : public StorageCommand {
 public:
     HLFSVolumeHostList()
-        : StorageCommand({"List hosts accessing a particular HLFS Volume.",
-                          ListOf(kColumns),
-                          "table",
-                          {
-                              {"-l datastore1",
-                               "List hosts using volume 'datastore1' with default liveness check of 'none'."},
-                              {"-l datastore1 -v quick",
-                               "List hosts using volume 'datastore1' with liveness check of 'quick'."},
-                          }})
+        : StorageCommand({
+              .description = "List hosts accessing a particular HLFS Volume.",
+              .result = ListOf(kColumns),
+              .formatter = "table",
+              .examples =
+                  {
+                      {"-l datastore1", "List hosts using volume 'datastore1' with default liveness check of 'none'."},
+                      {"-l datastore1 -v quick", "List hosts using volume 'datastore1' with liveness check of 'quick'."},
+                  },
+              .parameters =
+                  {
+                      HlfsLabelParameter(),
+                      HlfsUuidParameter(),
+                      {kLiveness, "v", ParameterType::String,
+                       "The type of liveness check to perform on the HLFS volume. Valid values are %ENUM% (default is "
+                       "none).",
+                       false,
+                       StringEnum({{"none", "No liveness check, just scan heartbeats (default)"},
+                                   {"quick", "Quick liveness check, wait for one heartbeat interval"}})},
+                  },
+          })
     {
     }
 
 private:
-    void DeclareParameters(const std::shared_ptr<InputSpec>& inputs) override
-    {
-        AddSingleHLFSVolumeParameters(inputs);
-        AddParameter(inputs, {kLiveness, "v", ParameterType::String,
-                              "The type of liveness check to perform on the HLFS volume. Valid values are %ENUM% "
-                              "(default is none).",
-                              false,
-                              StringEnum({{"none", "No liveness check, just scan heartbeats (default)"},
-                                          {"quick", "Quick liveness check, wait for one heartbeat interval"}})});
-    }
-
     void Run(const InputPtr& in, const OutputPtr& out) override
     {
         const bool quick = in->GetParameter(kLiveness) == "quick";

@@ -30,23 +30,18 @@ std::optional<bool> ReadOnlineUpgradeEnabled(const OutputPtr& out)
 const char* const kAts = "ats";
 const char* const kScsi = "scsi";
 
-const char* const kVolumeName = "Volume Name";
-const char* const kUuid = "UUID";
-const char* const kType = "Type";
-const char* const kLockingMode = "Locking Mode";
-const char* const kCompatible = "ATS Compatible";
-const char* const kUpgradeModes = "ATS Upgrade Modes";
-const char* const kIncompatibility = "ATS Incompatibility Reason";
+enum Field { kVolumeName, kUuid, kType, kLockingMode, kCompatible, kUpgradeModes, kIncompatibility };
 
-const ColumnTable kColumns("VolumeLockModeConfiguration", {
-                                                              {kVolumeName, ColumnType::String},
-                                                              {kUuid, ColumnType::String},
-                                                              {kType, ColumnType::String},
-                                                              {kLockingMode, ColumnType::String},
-                                                              {kCompatible, ColumnType::Bool},
-                                                              {kUpgradeModes, ColumnType::String},
-                                                              {kIncompatibility, ColumnType::String},
-                                                          });
+const ColumnTable kColumns("VolumeLockModeConfiguration",
+                           {
+                               {kVolumeName, "Volume Name", ColumnType::String},
+                               {kUuid, "UUID", ColumnType::String},
+                               {kType, "Type", ColumnType::String},
+                               {kLockingMode, "Locking Mode", ColumnType::String},
+                               {kCompatible, "ATS Compatible", ColumnType::Bool},
+                               {kUpgradeModes, "ATS Upgrade Modes", ColumnType::String},
+                               {kIncompatibility, "ATS Incompatibility Reason", ColumnType::String},
+                           });
 
 // A missing reason leaves the field at its empty value.
 void SetCompatibility(Row& row, bool compatible, const char* upgradeModes, const char* reason)
@@ -123,10 +118,10 @@ class HLFSVolumeLockModeList final : public StorageCommand {
 public:
     HLFSVolumeLockModeList()
         : StorageCommand(
-              {"List the on-disk critical section locking mode for HLFS volumes available on this host.",
-               ListOf(kColumns),
-               "table",
-               {
+              {.description = "List the on-disk critical section locking mode for HLFS volumes available on this host.",
+               .result = ListOf(kColumns),
+               .formatter = "table",
+               .examples = {
                    {"", "Show lockmodes for all HLFS volumes."},
                    {"-l datastore1", "Show lockmode for HLFS volume with label 'datastore1'."},
                    {"-l datastore1 -l datastore2",
@@ -134,18 +129,16 @@ public:
                    {"-l datastore1 -u 50ac1b12-6b9eebe0-6765-80c16e6d3408",
                     "Show lockmodes for HLFS volume with label 'datastore1' and HLFS volume with uuid "
                     "'50ac1b12-6b9eebe0-6765-80c16e6d3408'."},
+               },
+               .parameters = {
+                   LabelParameter("The label of the target HLFS volume.", ParameterType::StringList),
+                   UuidParameter("The uuid of the target HLFS volume.", ParameterType::StringList),
+                   IgnoreErrorsParameter(),
                }})
     {
     }
 
 private:
-    void DeclareParameters(const std::shared_ptr<InputSpec>& inputs) override
-    {
-        AddLabelAndUuid(inputs, "The label of the target HLFS volume.", "The uuid of the target HLFS volume.",
-                        ParameterType::StringList);
-        inputs->AddParameter(IgnoreErrorInputParameter());
-    }
-
     void Run(const InputPtr& in, const OutputPtr& out) override
     {
         const SkipReport report{"Error getting data for filesystem on '", &HostCtl::Storage::FileSystem::GetMountPoint,
@@ -183,26 +176,26 @@ const VolumeSelectorTexts kLockModeTexts = {"You cannot specify both --ats and -
 class HLFSVolumeLockModeSet final : public StorageCommand {
 public:
     HLFSVolumeLockModeSet()
-        : StorageCommand({"Update the on-disk critical section locking mode for a particular HLFS Volume.",
-                          {},
-                          nullptr,
-                          {
-                              {"-a -l datastore1", "Configure HLFS volume with label 'datastore1'for ATS-only locking."},
-                              {"-s -u 50ac1b12-6b9eebe0-6765-80c16e6d3408",
-                               "Configure HLFS volume with uuid '50ac1b12-6b9eebe0-6765-80c16e6d3408' for SCSI "
-                               "locking."},
-                          }})
+        : StorageCommand({
+              .description = "Update the on-disk critical section locking mode for a particular HLFS Volume.",
+              .examples =
+                  {
+                      {"-a -l datastore1", "Configure HLFS volume with label 'datastore1'for ATS-only locking."},
+                      {"-s -u 50ac1b12-6b9eebe0-6765-80c16e6d3408",
+                       "Configure HLFS volume with uuid '50ac1b12-6b9eebe0-6765-80c16e6d3408' for SCSI locking."},
+                  },
+              .parameters =
+                  {
+                      HlfsLabelParameter(),
+                      HlfsUuidParameter(),
+                      {kAts, "a", ParameterType::Flag, "Enable ATS-only locking."},
+                      {kScsi, "s", ParameterType::Flag, "Enable SCSI locking."},
+                  },
+          })
     {
     }
 
 private:
-    void DeclareParameters(const std::shared_ptr<InputSpec>& inputs) override
-    {
-        AddSingleHLFSVolumeParameters(inputs);
-        AddParameter(inputs, {kAts, "a", ParameterType::Flag, "Enable ATS-only locking."});
-        AddParameter(inputs, {kScsi, "s", ParameterType::Flag, "Enable SCSI locking."});
-    }
-
     void Run(const InputPtr& in, const OutputPtr& out) override
     {
         const bool ats = in->IsFlagSet(kAts);

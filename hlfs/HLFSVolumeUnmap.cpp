@@ -18,17 +18,21 @@ constexpr std::int64_t kMaxReclaimUnit = std::numeric_limits<std::uint32_t>::max
 // storage hlfs unmap
 class HLFSVolumeUnmap final : public StorageCommand {
 public:
-    HLFSVolumeUnmap() : StorageCommand({"Reclaim the space by unmapping free blocks from HLFS Volume"}) {}
-
-private:
-    void DeclareParameters(const std::shared_ptr<InputSpec>& inputs) override
+    HLFSVolumeUnmap()
+        : StorageCommand({
+              .description = "Reclaim the space by unmapping free blocks from HLFS Volume",
+              .parameters =
+                  {
+                      LabelParameter("The label of the HLFS volume to unmap the free blocks."),
+                      UuidParameter("The uuid of the HLFS volume to unmap the free blocks."),
+                      {kReclaimUnitParameter, "n", ParameterType::Int,
+                       "Number of HLFS blocks that should be unmapped per iteration."},
+                  },
+          })
     {
-        AddLabelAndUuid(inputs, "The label of the HLFS volume to unmap the free blocks.",
-                        "The uuid of the HLFS volume to unmap the free blocks.");
-        AddParameter(inputs, {kReclaimUnitParameter, "n", ParameterType::Int,
-                              "Number of HLFS blocks that should be unmapped per iteration."});
     }
 
+private:
     void Run(const InputPtr& in, const OutputPtr& out) override;
 };
 

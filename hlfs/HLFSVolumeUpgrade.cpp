@@ -16,14 +16,14 @@ namespace {
 // storage hlfs upgrade
 class HLFSVolumeUpgrade final : public StorageCommand {
 public:
-    HLFSVolumeUpgrade() : StorageCommand({"Upgrade a HLFS3 volume to HLFS5."}) {}
-
-private:
-    void DeclareParameters(const std::shared_ptr<InputSpec>& inputs) override
+    HLFSVolumeUpgrade()
+        : StorageCommand({.description = "Upgrade a HLFS3 volume to HLFS5.",
+                          .parameters = {LabelParameter("The label of the HLFS volume to upgrade."),
+                                         UuidParameter("The uuid of the HLFS volume to upgrade.")}})
     {
-        AddLabelAndUuid(inputs, "The label of the HLFS volume to upgrade.", "The uuid of the HLFS volume to upgrade.");
     }
 
+private:
     void Run(const InputPtr& in, const OutputPtr& out) override
     {
         WithChosenVolume(in, out, [&](HlFileSystemImpl& volume, const std::string&) {

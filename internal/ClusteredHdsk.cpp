@@ -6,25 +6,25 @@ namespace OrvaneCli::FileSystem {
 
 namespace {
 
-constexpr const char* kEnabledField = "Enabled";
 constexpr const char* kEnabledParameter = "enabled";
 
-const ColumnTable kColumns("ClusteredHdskInfo", {{kEnabledField, ColumnType::Bool}}, false);
+enum Field { kEnabledField };
+const ColumnTable kColumns("ClusteredHdskInfo", {{kEnabledField, "Enabled", ColumnType::Bool}}, false);
 
 // storage internal clusteredhdsk get
 class ClusteredHdskGet final : public StorageCommand {
 public:
     ClusteredHdskGet()
-        : StorageCommand({"Get information about clustered HDSK support.", One(kColumns), "simple"})
+        : StorageCommand({
+              .description = "Get information about clustered HDSK support.",
+              .result = One(kColumns),
+              .formatter = "simple",
+              .parameters = {HlfsLabelParameter(), HlfsUuidParameter()},
+          })
     {
     }
 
 private:
-    void DeclareParameters(const std::shared_ptr<InputSpec>& inputs) override
-    {
-        AddSingleHLFSVolumeParameters(inputs);
-    }
-
     void Run(const InputPtr& in, const OutputPtr& out) override
     {
         const std::unique_ptr<HlFileSystem> volume = GetSingleHLFSVolume(in, out);
@@ -43,16 +43,21 @@ private:
 // storage internal clusteredhdsk set
 class ClusteredHdskSet final : public StorageCommand {
 public:
-    ClusteredHdskSet() : StorageCommand({"Enable or disable clustered HDSK support."}) {}
-
-private:
-    void DeclareParameters(const std::shared_ptr<InputSpec>& inputs) override
+    ClusteredHdskSet()
+        : StorageCommand({
+              .description = "Enable or disable clustered HDSK support.",
+              .parameters =
+                  {
+                      HlfsLabelParameter(),
+                      HlfsUuidParameter(),
+                      {kEnabledParameter, "e", ParameterType::Bool, "The new enabled state of the clustered HDSK support.",
+                       true},
+                  },
+          })
     {
-        AddSingleHLFSVolumeParameters(inputs);
-        AddParameter(inputs, {kEnabledParameter, "e", ParameterType::Bool,
-                              "The new enabled state of the clustered HDSK support.", true});
     }
 
+private:
     void Run(const InputPtr& in, const OutputPtr& out) override
     {
         const std::unique_ptr<HlFileSystem> volume = GetSingleHLFSVolume(in, out);

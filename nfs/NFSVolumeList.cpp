@@ -41,63 +41,63 @@ using VolumeQuery = std::vector<std::unique_ptr<NetworkFileSystem>> (*)(StorageI
                                                                          StorageInfoImpl::NetworkFileSystemFilter filter);
 
 const char* const kPeOnly = "pe-only";
-const char* const kVolumeName = "Volume Name";
-const char* const kHost = "Host";
-const char* const kHosts = "Host(s)";
-const char* const kShare = "Share";
-const char* const kKnxnic = "Knxnic";
-const char* const kKnxnics = "Knxnics";
-const char* const kConnections = "Connections";
-const char* const kAccessible = "Accessible";
-const char* const kMounted = "Mounted";
-const char* const kReadOnly = "Read-Only";
-const char* const kSecurity = "Security";
-const char* const kIsPE = "isPE";
-const char* const kAcceleration = "Hardware Acceleration";
+namespace V3 {
+enum Field { kVolumeName, kHost, kShare, kKnxnic, kConnections, kAccessible, kMounted, kReadOnly, kIsPE, kAcceleration };
+} // namespace V3
 
-const ColumnTable kV3Columns("NasMount", {
-    {kVolumeName, ColumnType::String},
-    {kHost, ColumnType::String},
-    {kShare, ColumnType::String},
-    {.title = kKnxnic, .type = ColumnType::String, .feature = Feature::NfsKnxnicBinding},
-    {.title = kConnections, .type = ColumnType::Int, .feature = Feature::NfsConnections, .shownAfter = kMounted},
-    {kAccessible, ColumnType::Bool},
-    {kMounted, ColumnType::Bool},
-    {kReadOnly, ColumnType::Bool},
-    {kIsPE, ColumnType::Bool},
-    {kAcceleration, ColumnType::String},
-});
+const ColumnTable kV3Columns(
+    "NasMount",
+    {
+        {V3::kVolumeName, "Volume Name", ColumnType::String},
+        {V3::kHost, "Host", ColumnType::String},
+        {V3::kShare, "Share", ColumnType::String},
+        {V3::kKnxnic, "Knxnic", ColumnType::String, {.feature = Feature::NfsKnxnicBinding}},
+        {V3::kConnections, "Connections", ColumnType::Int,
+         {.feature = Feature::NfsConnections, .shownAfter = V3::kMounted}},
+        {V3::kAccessible, "Accessible", ColumnType::Bool},
+        {V3::kMounted, "Mounted", ColumnType::Bool},
+        {V3::kReadOnly, "Read-Only", ColumnType::Bool},
+        {V3::kIsPE, "isPE", ColumnType::Bool},
+        {V3::kAcceleration, "Hardware Acceleration", ColumnType::String},
+    });
 
-const ColumnTable kV41Columns("NasMount", {
-    {kVolumeName, ColumnType::String},
-    {kHosts, ColumnType::String},
-    {kShare, ColumnType::String},
-    {.title = kKnxnics, .type = ColumnType::String, .feature = Feature::Nfs41KnxnicBinding},
-    {kAccessible, ColumnType::Bool},
-    {kMounted, ColumnType::Bool},
-    {kReadOnly, ColumnType::Bool},
-    {kSecurity, ColumnType::String},
-    {kIsPE, ColumnType::Bool},
-    {kAcceleration, ColumnType::String},
-});
+namespace V41 {
+enum Field { kVolumeName, kHosts, kShare, kKnxnics, kAccessible, kMounted, kReadOnly, kSecurity, kIsPE, kAcceleration };
+} // namespace V41
+
+const ColumnTable kV41Columns("NasMount",
+                              {
+                                  {V41::kVolumeName, "Volume Name", ColumnType::String},
+                                  {V41::kHosts, "Host(s)", ColumnType::String},
+                                  {V41::kShare, "Share", ColumnType::String},
+                                  {V41::kKnxnics, "Knxnics", ColumnType::String,
+                                   {.feature = Feature::Nfs41KnxnicBinding}},
+                                  {V41::kAccessible, "Accessible", ColumnType::Bool},
+                                  {V41::kMounted, "Mounted", ColumnType::Bool},
+                                  {V41::kReadOnly, "Read-Only", ColumnType::Bool},
+                                  {V41::kSecurity, "Security", ColumnType::String},
+                                  {V41::kIsPE, "isPE", ColumnType::Bool},
+                                  {V41::kAcceleration, "Hardware Acceleration", ColumnType::String},
+                              });
 
 // The list of one NFS version: one row per volume the filter lets through; a volume that
 // cannot be read is reported and left out.
 class NfsListCommand : public StorageCommand {
 protected:
     NfsListCommand(const char* description, const ColumnTable& columns, VolumeQuery query, const char* peOnly)
-        : StorageCommand({description, ListOf(columns), "table"}), query_(query), peOnly_(peOnly)
+        : StorageCommand({
+              .description = description,
+              .result = ListOf(columns),
+              .formatter = "table",
+              .parameters = {{kPeOnly, "p", ParameterType::Flag, peOnly}},
+          }),
+          query_(query)
     {
     }
 
     virtual void FillRow(NetworkFileSystem& volume, const RowShape& shape, Row& row) = 0;
 
 private:
-    void DeclareParameters(const std::shared_ptr<InputSpec>& inputs) override
-    {
-        AddParameter(inputs, {kPeOnly, "p", ParameterType::Flag, peOnly_});
-    }
-
     void Run(const InputPtr& in, const OutputPtr& out) override
     {
         const auto filter = in->IsFlagSet(kPeOnly) ? &StorageInfoImpl::IsPE : &StorageInfoImpl::IsNotHidden;
@@ -116,7 +116,6 @@ private:
     }
 
     VolumeQuery query_;
-    const char* peOnly_;
 };
 
 // storage nfs list
@@ -134,6 +133,7 @@ public:
 private:
     void FillRow(NetworkFileSystem& volume, const RowShape& shape, Row& row) override
     {
+        using namespace V3;
         row.Set(kVolumeName, volume.GetVolumeName());
         row.Set(kHost, volume.GetRemoteHost());
         row.Set(kShare, volume.GetRemoteShare());
@@ -166,6 +166,7 @@ public:
 private:
     void FillRow(NetworkFileSystem& volume, const RowShape& shape, Row& row) override
     {
+        using namespace V41;
         row.Set(kVolumeName, volume.GetVolumeName());
         row.Set(kHosts, JoinWithCommas(volume.GetRemoteHosts()));
         row.Set(kShare, volume.GetRemoteShare());

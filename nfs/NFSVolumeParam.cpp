@@ -24,40 +24,29 @@ std::vector<std::unique_ptr<NetworkFileSystem>> NonPEV41Volumes(StorageInfoImpl&
     return storage.GetV41NetworkFileSystems(&StorageInfoImpl::IsNotPE);
 }
 
-const char* const kVolumeNameField = "Volume Name";
-const char* const kMaxQueueDepthField = "MaxQueueDepth";
-const char* const kMaxReadField = "MaxReadTransferSize";
-const char* const kMaxWriteField = "MaxWriteTransferSize";
-const char* const kKnxnicField = "Knxnic";
-const char* const kKnxnicsField = "Knxnics";
-const char* const kConnectionsField = "Connections";
+// The first four fields are the same in both versions; each adds its own after them.
+enum Field { kVolumeNameField, kMaxQueueDepthField, kMaxReadField, kMaxWriteField, kKnxnicField, kConnectionsField };
+constexpr int kKnxnicsField = kKnxnicField;
 
-const ColumnTable kV3Columns("NasMountParams", {
-    {kVolumeNameField, ColumnType::String},
-    {kMaxQueueDepthField, ColumnType::Int},
-    {kMaxReadField, ColumnType::Int},
-    {kMaxWriteField, ColumnType::Int},
-    {.title = kKnxnicField, .type = ColumnType::String, .feature = Feature::NfsKnxnicBinding},
-    {.title = kConnectionsField, .type = ColumnType::Int, .feature = Feature::NfsConnections},
-});
+const ColumnTable kV3Columns(
+    "NasMountParams",
+    {
+        {kVolumeNameField, "Volume Name", ColumnType::String},
+        {kMaxQueueDepthField, "MaxQueueDepth", ColumnType::Int},
+        {kMaxReadField, "MaxReadTransferSize", ColumnType::Int},
+        {kMaxWriteField, "MaxWriteTransferSize", ColumnType::Int},
+        {kKnxnicField, "Knxnic", ColumnType::String, {.feature = Feature::NfsKnxnicBinding}},
+        {kConnectionsField, "Connections", ColumnType::Int, {.feature = Feature::NfsConnections}},
+    });
 
-const ColumnTable kV41Columns("NasMountParams", {
-    {kVolumeNameField, ColumnType::String},
-    {kMaxQueueDepthField, ColumnType::Int},
-    {kMaxReadField, ColumnType::Int},
-    {kMaxWriteField, ColumnType::Int},
-    {.title = kKnxnicsField, .type = ColumnType::String, .feature = Feature::Nfs41KnxnicBinding},
-});
-
-void AddVolumeName(const std::shared_ptr<InputSpec>& inputs, const char* description)
-{
-    AddParameter(inputs, {kOptionVolumeName, "v", ParameterType::String, description, true});
-}
-
-void AddMaxQueueDepthParameter(const std::shared_ptr<InputSpec>& inputs, const char* description)
-{
-    AddParameter(inputs, {kMaxQueueDepth, "q", ParameterType::Int, description, false, IntRange(1, 4294967295L)});
-}
+const ColumnTable kV41Columns("NasMountParams",
+                              {
+                                  {kVolumeNameField, "Volume Name", ColumnType::String},
+                                  {kMaxQueueDepthField, "MaxQueueDepth", ColumnType::Int},
+                                  {kMaxReadField, "MaxReadTransferSize", ColumnType::Int},
+                                  {kMaxWriteField, "MaxWriteTransferSize", ColumnType::Int},
+                                  {kKnxnicsField, "Knxnics", ColumnType::String, {.feature = Feature::Nfs41KnxnicBinding}},
+                              });
 
 // Rows of the non-PE volumes named `name` (only the first that could be read), or of every
 // one for "all". `fillExtras` sets the fields after the sizes. A volume's name is read outside
@@ -130,57 +119,100 @@ void ApplyMaxQueueDepth(const InputPtr& in, NetworkFileSystem& volume)
     }
 }
 
+ParameterDecl MaxQueueDepthParameter(const char* description)
+{
+    return {kMaxQueueDepth, "q", ParameterType::Int, description, false, IntRange(1, 4294967295L)};
+}
+
+// The parameter listing of one NFS version.
+class ParamGetCommand : public StorageCommand {
+protected:
+    ParamGetCommand(const char* description, const ColumnTable& columns, const char* volumeName, VolumeQuery query)
+        : StorageCommand({
+              .description = description,
+              .result = ListOf(columns),
+              .formatter = "table",
+              .parameters = {{kOptionVolumeName, "v", ParameterType::String, volumeName, true}},
+          }),
+          query_(query)
+    {
+    }
+
+    // Sets the fields after the sizes.
+    virtual void FillExtras(NetworkFileSystem& volume, const RowShape& shape, Row& row) = 0;
+
+private:
+    void Run(const InputPtr& in, const OutputPtr& out) override
+    {
+        const RowShape shape = Rows();
+        ListVolumeParams(in->GetParameter(kOptionVolumeName), query_, shape, out,
+                         [&](NetworkFileSystem& volume, Row& row) { FillExtras(volume, shape, row); });
+    }
+
+    VolumeQuery query_;
+};
+
 // storage nfs param get
-class NFSVolumeParamGet final : public StorageCommand {
+class NFSVolumeParamGet final : public ParamGetCommand {
 public:
     NFSVolumeParamGet()
-        : StorageCommand({"Get the volume parameters of the NAS volumes.", ListOf(kV3Columns), "table"})
+        : ParamGetCommand("Get the volume parameters of the NAS volumes.", kV3Columns,
+                          "NAS volume name(\"all\" to list all).", NonPEV3Volumes)
     {
     }
 
 private:
-    void DeclareParameters(const std::shared_ptr<InputSpec>& inputs) override
+    void FillExtras(NetworkFileSystem& volume, const RowShape& shape, Row& row) override
     {
-        AddVolumeName(inputs, "NAS volume name(\"all\" to list all).");
+        if (shape.Has(kKnxnicField)) {
+            row.Set(kKnxnicField, volume.GetKnxnics());
+        }
+        if (shape.Has(kConnectionsField)) {
+            row.Set(kConnectionsField, static_cast<long>(volume.GetConnectionsParam()));
+        }
+    }
+};
+
+// storage nfs41 param get
+class NFS41VolumeParamGet final : public ParamGetCommand {
+public:
+    NFS41VolumeParamGet()
+        : ParamGetCommand("Get the volume parameters of the NFS v4.1 volumes.", kV41Columns,
+                          "NFS v4.1 volume name(\"all\" to list all).", NonPEV41Volumes)
+    {
     }
 
-    void Run(const InputPtr& in, const OutputPtr& out) override
+private:
+    void FillExtras(NetworkFileSystem& volume, const RowShape& shape, Row& row) override
     {
-        const RowShape shape = Rows();
-        ListVolumeParams(in->GetParameter(kOptionVolumeName), NonPEV3Volumes, shape, out,
-                         [&](NetworkFileSystem& volume, Row& row) {
-                             if (shape.Has(kKnxnicField)) {
-                                 row.Set(kKnxnicField, volume.GetKnxnics());
-                             }
-                             if (shape.Has(kConnectionsField)) {
-                                 row.Set(kConnectionsField, static_cast<long>(volume.GetConnectionsParam()));
-                             }
-                         });
+        if (shape.Has(kKnxnicsField)) {
+            row.Set(kKnxnicsField, volume.GetKnxnics());
+        }
     }
 };
 
 // storage nfs param set
 class NFSVolumeParamSet final : public StorageCommand {
 public:
-    NFSVolumeParamSet() : StorageCommand({"Set the volume parameters of the NAS volumes."}) {}
-
-private:
-    void DeclareParameters(const std::shared_ptr<InputSpec>& inputs) override
+    NFSVolumeParamSet()
+        : StorageCommand({
+              .description = "Set the volume parameters of the NAS volumes.",
+              .parameters =
+                  {
+                      {kOptionVolumeName, "v", ParameterType::String, "The NAS volume name.", true},
+                      MaxQueueDepthParameter("The maximum queue depth for the NAS volume."),
+                      {kKnxnic, "I", ParameterType::String, "The new knxnic to be configured for the NAS volume.",
+                       false, nullptr, Feature::NfsKnxnicBinding},
+                      {kOptionConnections, "c", ParameterType::Int,
+                       "The number of RPC connections to be established for the NFS datastore. A higher number of "
+                       "connections yields better performance on datastores with higher IO load.",
+                       false, IntRange(1, 8), Feature::NfsConnections},
+                  },
+          })
     {
-        AddVolumeName(inputs, "The NAS volume name.");
-        AddMaxQueueDepthParameter(inputs, "The maximum queue depth for the NAS volume.");
-        if (IsFeatureEnabled(Feature::NfsKnxnicBinding)) {
-            AddParameter(inputs,
-                         {kKnxnic, "I", ParameterType::String, "The new knxnic to be configured for the NAS volume."});
-        }
-        if (IsFeatureEnabled(Feature::NfsConnections)) {
-            AddParameter(inputs, {kOptionConnections, "c", ParameterType::Int,
-                                  "The number of RPC connections to be established for the NFS datastore. A higher "
-                                  "number of connections yields better performance on datastores with higher IO load.",
-                                  false, IntRange(1, 8)});
-        }
     }
 
+private:
     void Run(const InputPtr& in, const OutputPtr& out) override
     {
         const bool knxnicBinding = IsFeatureEnabled(Feature::NfsKnxnicBinding);
@@ -202,50 +234,26 @@ private:
     }
 };
 
-// storage nfs41 param get
-class NFS41VolumeParamGet final : public StorageCommand {
-public:
-    NFS41VolumeParamGet()
-        : StorageCommand({"Get the volume parameters of the NFS v4.1 volumes.", ListOf(kV41Columns), "table"})
-    {
-    }
-
-private:
-    void DeclareParameters(const std::shared_ptr<InputSpec>& inputs) override
-    {
-        AddVolumeName(inputs, "NFS v4.1 volume name(\"all\" to list all).");
-    }
-
-    void Run(const InputPtr& in, const OutputPtr& out) override
-    {
-        const RowShape shape = Rows();
-        ListVolumeParams(in->GetParameter(kOptionVolumeName), NonPEV41Volumes, shape, out,
-                         [&](NetworkFileSystem& volume, Row& row) {
-                             if (shape.Has(kKnxnicsField)) {
-                                 row.Set(kKnxnicsField, volume.GetKnxnics());
-                             }
-                         });
-    }
-};
-
 // storage nfs41 param set
 class NFS41VolumeParamSet final : public StorageCommand {
 public:
-    NFS41VolumeParamSet() : StorageCommand({"Set the volume parameters of the NFS v4.1 volumes."}) {}
-
-private:
-    void DeclareParameters(const std::shared_ptr<InputSpec>& inputs) override
+    NFS41VolumeParamSet()
+        : StorageCommand({
+              .description = "Set the volume parameters of the NFS v4.1 volumes.",
+              .parameters =
+                  {
+                      {kOptionVolumeName, "v", ParameterType::String, "The NFS v4.1 volume name.", true},
+                      MaxQueueDepthParameter("The maximum queue depth for the NFS v4.1 volume."),
+                      {kOptionHostKnxnic, "I", ParameterType::StringList,
+                       "The hostname or IP address followed by a colon(:) and knxnic name. This parameter can be "
+                       "specified more than once. E.g.: --host-knxnic=host1:knxnic1 --host-knxnic=ip2:knxnic2",
+                       false, nullptr, Feature::Nfs41KnxnicBinding},
+                  },
+          })
     {
-        AddVolumeName(inputs, "The NFS v4.1 volume name.");
-        AddMaxQueueDepthParameter(inputs, "The maximum queue depth for the NFS v4.1 volume.");
-        if (IsFeatureEnabled(Feature::Nfs41KnxnicBinding)) {
-            AddParameter(inputs, {kOptionHostKnxnic, "I", ParameterType::StringList,
-                                  "The hostname or IP address followed by a colon(:) and knxnic name. This parameter "
-                                  "can be specified more than once. E.g.: --host-knxnic=host1:knxnic1 "
-                                  "--host-knxnic=ip2:knxnic2"});
-        }
     }
 
+private:
     void Run(const InputPtr& in, const OutputPtr& out) override
     {
         std::vector<std::string> hostKnxnics;

@@ -15,17 +15,14 @@ class PreunmountCommand : public StorageCommand {
 protected:
     PreunmountCommand(const char* description, const char* volumeName, PreunmountOperation operation,
                       const char* failurePrefix)
-        : StorageCommand({description}), volumeNameDescription_(volumeName), operation_(operation),
+        : StorageCommand({.description = description,
+                          .parameters = {{kOptionVolumeName, "v", ParameterType::String, volumeName, true}}}),
+          operation_(operation),
           failurePrefix_(failurePrefix)
     {
     }
 
 private:
-    void DeclareParameters(const std::shared_ptr<InputSpec>& inputs) override
-    {
-        AddParameter(inputs, {kOptionVolumeName, "v", ParameterType::String, volumeNameDescription_, true});
-    }
-
     void Run(const InputPtr& in, const OutputPtr& out) override
     {
         // A failure to reach the storage information is not this command's to report.
@@ -40,7 +37,6 @@ private:
         });
     }
 
-    const char* volumeNameDescription_;
     PreunmountOperation operation_;
     const char* failurePrefix_;
 };

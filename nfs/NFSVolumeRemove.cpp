@@ -12,16 +12,13 @@ namespace {
 class NfsRemoveCommand : public StorageCommand {
 protected:
     NfsRemoveCommand(const char* description, const char* volumeName, HostCtl::Storage::NfsVersion version)
-        : StorageCommand({description}), volumeNameDescription_(volumeName), version_(version)
+        : StorageCommand({.description = description,
+                          .parameters = {{kOptionVolumeName, "v", ParameterType::String, volumeName, true}}}),
+          version_(version)
     {
     }
 
 private:
-    void DeclareParameters(const std::shared_ptr<InputSpec>& inputs) override
-    {
-        AddParameter(inputs, {kOptionVolumeName, "v", ParameterType::String, volumeNameDescription_, true});
-    }
-
     void Run(const InputPtr& in, const OutputPtr& out) override
     {
         const std::string volumeName = in->GetParameter(kOptionVolumeName);
@@ -36,7 +33,6 @@ private:
         }
     }
 
-    const char* volumeNameDescription_;
     HostCtl::Storage::NfsVersion version_;
 };
 

@@ -37,9 +37,9 @@ struct Nfs41ClientRuleset {
 };
 
 constexpr const char* kIpMask = "ip-mask";
-const char* const kAllowedIpMask = "Allowed IPMask";
 
-const ColumnTable kColumns("NasFirewallConfigs", {{kAllowedIpMask, ColumnType::String}}, false);
+enum Field { kAllowedIpMask };
+const ColumnTable kColumns("NasFirewallConfigs", {{kAllowedIpMask, "Allowed IPMask", ColumnType::String}}, false);
 
 // Only entries with a mask may be added: IPv4 with /0-32 (1) or IPv6 with /0-128 (3).
 bool IsIpMask(const std::string& text)
@@ -48,38 +48,49 @@ bool IsIpMask(const std::string& text)
     return type == 1 || type == 3;
 }
 
-// add and remove: one IP/Mask entry.
+// add and remove: one IP/Mask entry handed to the host for the rule set of `version`.
 class IpMaskCommand : public StorageCommand {
 protected:
-    IpMaskCommand(const char* description, const char* ipMask) : StorageCommand({description}), ipMask_(ipMask) {}
+    using Change = void (*)(StorageInfoImpl& storage, const std::string& ipMask, NfsVersion version);
 
-private:
-    void DeclareParameters(const std::shared_ptr<InputSpec>& inputs) override
+    // `masksOnly`: refuse an entry without a mask before the host is asked.
+    IpMaskCommand(const char* description, const char* ipMask, NfsVersion version, Change change, bool masksOnly)
+        : StorageCommand({.description = description, .parameters = {{kIpMask, "F", ParameterType::String, ipMask, true}}}),
+          version_(version), change_(change), masksOnly_(masksOnly)
     {
-        AddParameter(inputs, {kIpMask, "F", ParameterType::String, ipMask_, true});
     }
 
-    const char* ipMask_;
+private:
+    void Run(const InputPtr& in, const OutputPtr& out) override
+    {
+        const std::string& ipMask = in->GetParameter(kIpMask);
+        if (masksOnly_ && !IsIpMask(ipMask)) {
+            out->AddErrorMessage("Only IP/Mask entries are allowed to be added");
+            return;
+        }
+        WithStorageInfo(StorageInfoPlacement::InsideGuard, out, [&](StorageInfoImpl& storage) {
+            change_(storage, ipMask, version_);
+            out->SetRootObject(MetaBool::New(true));
+        });
+    }
+
+    NfsVersion version_;
+    Change change_;
+    bool masksOnly_;
 };
 
 // storage nfs firewall add, storage nfs41 firewall add
 template <typename Ruleset>
 class NasFirewallAdd final : public IpMaskCommand {
 public:
-    NasFirewallAdd() : IpMaskCommand(Ruleset::addDescription, Ruleset::addParameter) {}
-
-private:
-    void Run(const InputPtr& in, const OutputPtr& out) override
+    NasFirewallAdd()
+        : IpMaskCommand(
+              Ruleset::addDescription, Ruleset::addParameter, Ruleset::version,
+              [](StorageInfoImpl& storage, const std::string& ipMask, NfsVersion version) {
+                  storage.AddNasFirewallConfig(ipMask, version);
+              },
+              true)
     {
-        const std::string& ipMask = in->GetParameter(kIpMask);
-        if (!IsIpMask(ipMask)) {
-            out->AddErrorMessage("Only IP/Mask entries are allowed to be added");
-            return;
-        }
-        WithStorageInfo(StorageInfoPlacement::InsideGuard, out, [&](StorageInfoImpl& storage) {
-            storage.AddNasFirewallConfig(ipMask, Ruleset::version);
-            out->SetRootObject(MetaBool::New(true));
-        });
     }
 };
 
@@ -88,16 +99,14 @@ private:
 template <typename Ruleset>
 class NasFirewallRemove final : public IpMaskCommand {
 public:
-    NasFirewallRemove() : IpMaskCommand(Ruleset::removeDescription, Ruleset::removeParameter) {}
-
-private:
-    void Run(const InputPtr& in, const OutputPtr& out) override
+    NasFirewallRemove()
+        : IpMaskCommand(
+              Ruleset::removeDescription, Ruleset::removeParameter, Ruleset::version,
+              [](StorageInfoImpl& storage, const std::string& ipMask, NfsVersion version) {
+                  storage.RemoveNasFirewallConfig(ipMask, version);
+              },
+              false)
     {
-        const std::string& ipMask = in->GetParameter(kIpMask);
-        WithStorageInfo(StorageInfoPlacement::InsideGuard, out, [&](StorageInfoImpl& storage) {
-            storage.RemoveNasFirewallConfig(ipMask, Ruleset::version);
-            out->SetRootObject(MetaBool::New(true));
-        });
     }
 };
 
@@ -105,7 +114,10 @@ private:
 template <typename Ruleset>
 class NasFirewallList final : public StorageCommand {
 public:
-    NasFirewallList() : StorageCommand({Ruleset::listDescription, One(kColumns), "simple"}) {}
+    NasFirewallList()
+        : StorageCommand({.description = Ruleset::listDescription, .result = One(kColumns), .formatter = "simple"})
+    {
+    }
 
 private:
     void Run(const InputPtr&, const OutputPtr& out) override
