@@ -6,10 +6,7 @@ namespace OrvaneCli::FileSystem {
 
 namespace {
 
-bool Present(const Column& column)
-{
-    return !column.options.feature || IsFeatureEnabled(*column.options.feature);
-}
+bool Present(const Column& column) { return !column.options.feature || IsFeatureEnabled(*column.options.feature); }
 
 } // namespace
 
@@ -17,9 +14,11 @@ ColumnTable::ColumnTable(const char* structure, std::vector<Column> columns, boo
     : structure_(structure), columns_(std::move(columns)), fieldsHint_(fieldsHint), header_(header)
 {
     for (std::size_t i = 0; i < columns_.size(); ++i) {
-        if (columns_[i].field != static_cast<int>(i)) {
-            throw std::logic_error(std::string("column '") + columns_[i].title + "' of " + structure +
-                                   " is not at the place its field number says");
+        for (std::size_t j = 0; j < i; ++j) {
+            if (columns_[i].field == columns_[j].field) {
+                throw std::logic_error(std::string("columns '") + columns_[j].title + "' and '" + columns_[i].title +
+                                       "' of " + structure + " share a field number");
+            }
         }
     }
 }
@@ -49,12 +48,12 @@ void ColumnTable::DeclareHints(CommandSpec& command) const
         }
     }
     for (const Column* column : placedLater) {
-        const char* after = columns_.at(static_cast<std::size_t>(column->options.shownAfter)).title;
+        const Column* after = shape.Find(column->options.shownAfter);
         auto anchor = view.begin();
-        while (anchor != view.end() && *anchor != after) {
+        while (after != nullptr && anchor != view.end() && *anchor != after->title) {
             ++anchor;
         }
-        if (anchor == view.end()) {
+        if (after == nullptr || anchor == view.end()) {
             throw std::logic_error(std::string("column '") + column->title + "' is placed after a column not shown");
         }
         view.insert(anchor + 1, column->title);

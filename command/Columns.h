@@ -22,8 +22,8 @@ struct ColumnOptions {
     int shownAfter = -1;                           // in the default view, placed right after this field
 };
 
-// One column. `field` is the command's own number for it (an enumerator), which is also its
-// position in the table: commands fill rows by these numbers, never by title.
+// One column. `field` is the command's own number for it (an enumerator): commands fill rows
+// by these numbers, never by title. Tables of one command family may share the numbers.
 struct Column {
     int field;
     const char* title;
@@ -35,9 +35,10 @@ class RowShape;
 
 class ColumnTable {
 public:
-    // `fieldsHint`: declare the default view; `header`: the "header:" hint, if any. A column
-    // out of its place throws std::logic_error.
-    ColumnTable(const char* structure, std::vector<Column> columns, bool fieldsHint = true, const char* header = nullptr);
+    // `fieldsHint`: declare the default view; `header`: the "header:" hint, if any. A field
+    // number used twice throws std::logic_error.
+    ColumnTable(const char* structure, std::vector<Column> columns, bool fieldsHint = true,
+                const char* header = nullptr);
 
     const char* Structure() const { return structure_; }
     // The columns as the feature switches are now; every row made from it has that shape.
@@ -66,7 +67,9 @@ public:
 
 private:
     friend class RowShape;
-    Row(const RowShape& shape, std::shared_ptr<MetaStruct> structure) : shape_(&shape), structure_(std::move(structure)) {}
+    Row(const RowShape& shape, std::shared_ptr<MetaStruct> structure) : shape_(&shape), structure_(std::move(structure))
+    {
+    }
     const Column& Expect(int field, ColumnType type) const;
 
     const RowShape* shape_;

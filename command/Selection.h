@@ -74,6 +74,17 @@ auto FindVolume(const VolumeChoice& choice, const VolumeSelectorTexts& texts, co
 // An empty pointer means failure; the reason is already on `out`.
 std::unique_ptr<HlFileSystem> GetSingleHLFSVolume(const InputPtr& in, const OutputPtr& out);
 
+// Runs `act(volume)` in the guarded region on the volume GetSingleHLFSVolume finds; nothing
+// runs when it finds none.
+template <typename Act>
+void WithSingleHLFSVolume(const InputPtr& in, const OutputPtr& out, Act&& act)
+{
+    const std::unique_ptr<HlFileSystem> volume = GetSingleHLFSVolume(in, out);
+    if (volume) {
+        Guarded(out, [&] { act(*volume); });
+    }
+}
+
 // How a listing reports a volume it passes over: "<prefix><name>': <host message>, skipping.".
 // The name is read only after the failure; if that fails too, the failure leaves the walk.
 struct SkipReport {
@@ -92,8 +103,8 @@ bool ReadOrSkip(Volume& volume, const SkipReport& report, const OutputPtr& out, 
         return true;
     } catch (const HostCtlException& e) {
         if (!report.quiet) {
-            out->AddErrorMessage(HostCtl::Misc::StrCat(report.prefix, (volume.*report.name)(), "': ", e.message,
-                                                       ", skipping."));
+            out->AddErrorMessage(
+                HostCtl::Misc::StrCat(report.prefix, (volume.*report.name)(), "': ", e.message, ", skipping."));
         }
         return false;
     }

@@ -35,10 +35,13 @@ struct CommandDecl {
     std::vector<ParameterDecl> parameters = {}; // in the order help shows them
 };
 
+// A leaf command inherits this constructor and adds its Run; its declaration is handed over
+// where the area's factory makes it.
 class StorageCommand : public Command {
-protected:
+public:
     explicit StorageCommand(CommandDecl decl);
 
+protected:
     // Adds the command's parameters: those of its declaration, unless it decides them afresh
     // (from the feature switches) at every call.
     virtual void DeclareParameters(const std::shared_ptr<InputSpec>& inputs);
@@ -69,10 +72,10 @@ private:
 };
 
 // Makes a command for the tree.
-template <typename Leaf>
-std::shared_ptr<Command> New()
+template <typename Leaf, typename... Args>
+std::shared_ptr<Command> New(Args&&... args)
 {
-    return std::make_shared<Leaf>();
+    return std::make_shared<Leaf>(std::forward<Args>(args)...);
 }
 
 } // namespace OrvaneCli::FileSystem

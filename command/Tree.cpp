@@ -14,6 +14,9 @@ NamespacePtr MakeNamespace(const char* description, std::initializer_list<Child>
     return ns;
 }
 
-void Attach(const NodePtr& parent, const char* name, NodePtr node) { parent->RegisterNamespaceNode(std::move(node), name); }
+void Attach(const NodePtr& parent, const char* name, NodePtr node)
+{
+    parent->RegisterNamespaceNode(std::move(node), name);
+}
 
 } // namespace OrvaneCli::FileSystem

@@ -9,8 +9,9 @@ namespace {
 class VolumeAutomount final : public HostActionCommand {
 public:
     VolumeAutomount()
-        : HostActionCommand("Request mounting of known datastores not explicitly unmounted.",
-                            [](StorageInfoImpl& storage) { storage.AutoFullMountVolumes(); }, StorageInfoPlacement::OutsideGuard)
+        : HostActionCommand(
+              "Request mounting of known datastores not explicitly unmounted.",
+              [](StorageInfoImpl& storage) { storage.AutoFullMountVolumes(); }, StorageInfoPlacement::OutsideGuard)
     {
     }
 };

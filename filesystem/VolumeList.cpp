@@ -22,23 +22,18 @@ const ColumnTable kColumns("FilesystemVolume", {
 
 const char* const kUuidParameter = "uuid";
 
+const CommandDecl kDecl = {
+    .description = "List the volumes available to the host. This includes HLFS, NAS, VFAT and UFS partitions.",
+    .result = ListOf(kColumns),
+    .formatter = "table",
+    .parameters = {{kUuidParameter, "u", ParameterType::String,
+                    "Only show information for the filesystem with the specified UUID."},
+                   IgnoreErrorsParameter()}};
+
 // storage filesystem list
 class VolumeList final : public StorageCommand {
-public:
-    VolumeList()
-        : StorageCommand({
-              .description =
-                  "List the volumes available to the host. This includes HLFS, NAS, VFAT and UFS partitions.",
-              .result = ListOf(kColumns),
-              .formatter = "table",
-              .parameters = {{kUuidParameter, "u", ParameterType::String,
-                              "Only show information for the filesystem with the specified UUID."},
-                             IgnoreErrorsParameter()},
-          })
-    {
-    }
+    using StorageCommand::StorageCommand;
 
-private:
     void Run(const InputPtr& in, const OutputPtr& out) override
     {
         // Asking for the mount point may fail again; that failure ends the walk through the
@@ -64,9 +59,8 @@ private:
             // The list is the result even when single volumes fail to be read; a volume that
             // fails is left out whole.
             out->SetRootObject(list);
-            ReadEachOrSkip(fileSystems, report, out, [&](HostFileSystem& fileSystem) {
-                list->Add(FillRow(shape, fileSystem).Structure());
-            });
+            ReadEachOrSkip(fileSystems, report, out,
+                           [&](HostFileSystem& fileSystem) { list->Add(FillRow(shape, fileSystem).Structure()); });
         });
     }
 
@@ -96,6 +90,6 @@ private:
 
 } // namespace
 
-NodePtr NewVolumeList() { return New<VolumeList>(); }
+NodePtr NewVolumeList() { return New<VolumeList>(kDecl); }
 
 } // namespace OrvaneCli::FileSystem

@@ -16,26 +16,20 @@ const VolumeSelectorTexts kTexts = {
     kUuidNotFound,
 };
 
+const CommandDecl kDecl = {
+    .description = "Connect to and mount an unmounted volume on the Zephal host.",
+    .parameters = {
+        LabelParameter(
+            "The label of the volume to mount. This volume must be unmounted for this operation to succeed."),
+        UuidParameter("The UUID of the HLFS filesystem to mount. This volume must be unmounted for this operation "
+                      "to succeed."),
+        {kOptionNoPersist, "n", ParameterType::Flag,
+         "Mount the volume non-persistently; the volume will not be mounted after a restart."}}};
+
 // storage filesystem mount
 class VolumeMount final : public StorageCommand {
-public:
-    VolumeMount()
-        : StorageCommand({
-              .description = "Connect to and mount an unmounted volume on the Zephal host.",
-              .parameters =
-                  {
-                      LabelParameter("The label of the volume to mount. This volume must be unmounted for this "
-                                     "operation to succeed."),
-                      UuidParameter("The UUID of the HLFS filesystem to mount. This volume must be unmounted for "
-                                    "this operation to succeed."),
-                      {kOptionNoPersist, "n", ParameterType::Flag,
-                       "Mount the volume non-persistently; the volume will not be mounted after a restart."},
-                  },
-          })
-    {
-    }
+    using StorageCommand::StorageCommand;
 
-private:
     void Run(const InputPtr& in, const OutputPtr& out) override
     {
         const std::string uuid = in->GetParameter(kOptionVolumeUuid);
@@ -76,6 +70,6 @@ private:
 
 } // namespace
 
-NodePtr NewVolumeMount() { return New<VolumeMount>(); }
+NodePtr NewVolumeMount() { return New<VolumeMount>(kDecl); }
 
 } // namespace OrvaneCli::FileSystem

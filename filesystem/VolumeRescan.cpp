@@ -9,8 +9,9 @@ namespace {
 class VolumeRescan final : public HostActionCommand {
 public:
     VolumeRescan()
-        : HostActionCommand("Scan storage devices for new mountable filesystems.", [](StorageInfoImpl& storage) { storage.RescanHlfs(); },
-                            StorageInfoPlacement::OutsideGuard)
+        : HostActionCommand(
+              "Scan storage devices for new mountable filesystems.",
+              [](StorageInfoImpl& storage) { storage.RescanHlfs(); }, StorageInfoPlacement::OutsideGuard)
     {
     }
 };

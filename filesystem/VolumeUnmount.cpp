@@ -145,28 +145,20 @@ void UnmountAllHlfs(StorageInfoImpl& storage, FileSystem::MountOperationOption o
     out->SetRootObject(MetaBool::New(true));
 }
 
+const CommandDecl kDecl = {
+    .description = "Disconnect and unmount and existing HLFS or NAS volume. This will not delete the configuration "
+                   "for the volume, but will remove the volume from the list of mounted volumes.",
+    .parameters = {LabelParameter("The label of the volume to unmount."),
+                   {kVolumePath, "p", ParameterType::String, "The path of the volume to unmount."},
+                   UuidParameter("The uuid of the volume to unmount."),
+                   {kOptionNoPersist, "n", ParameterType::Flag,
+                    "Unmount the volume non-persistently; the volume will be automounted after a restart."},
+                   {kUnmountAllHlfs, "a", ParameterType::Flag, "Unmount all hlfs volumes."}}};
+
 // storage filesystem unmount
 class VolumeUnmount final : public StorageCommand {
-public:
-    VolumeUnmount()
-        : StorageCommand({
-              .description = "Disconnect and unmount and existing HLFS or NAS volume. This will not delete the "
-                             "configuration for the volume, but will remove the volume from the list of mounted "
-                             "volumes.",
-              .parameters =
-                  {
-                      LabelParameter("The label of the volume to unmount."),
-                      {kVolumePath, "p", ParameterType::String, "The path of the volume to unmount."},
-                      UuidParameter("The uuid of the volume to unmount."),
-                      {kOptionNoPersist, "n", ParameterType::Flag,
-                       "Unmount the volume non-persistently; the volume will be automounted after a restart."},
-                      {kUnmountAllHlfs, "a", ParameterType::Flag, "Unmount all hlfs volumes."},
-                  },
-          })
-    {
-    }
+    using StorageCommand::StorageCommand;
 
-private:
     void Run(const InputPtr& in, const OutputPtr& out) override
     {
         const std::string label = in->GetParameter(kOptionVolumeLabel);
@@ -191,6 +183,6 @@ private:
 
 } // namespace
 
-NodePtr NewVolumeUnmount() { return New<VolumeUnmount>(); }
+NodePtr NewVolumeUnmount() { return New<VolumeUnmount>(kDecl); }
 
 } // namespace OrvaneCli::FileSystem

@@ -18,20 +18,15 @@ const ColumnTable kColumns("FilesystemHLFSExtents",
                                {kExtentNumber, "Extent Number", ColumnType::Int, {.shownAfter = kHlfsUuid}},
                            });
 
+const CommandDecl kHLFSExtentListDecl = {.description = "List the HLFS extents available on the host.",
+                                         .result = ListOf(kColumns),
+                                         .formatter = "table",
+                                         .parameters = {IgnoreErrorsParameter()}};
+
 // storage hlfs extent list
 class HLFSExtentList final : public StorageCommand {
-public:
-    HLFSExtentList()
-        : StorageCommand({
-              .description = "List the HLFS extents available on the host.",
-              .result = ListOf(kColumns),
-              .formatter = "table",
-              .parameters = {IgnoreErrorsParameter()},
-          })
-    {
-    }
+    using StorageCommand::StorageCommand;
 
-private:
     // One row per extent, grouped by volume in the host's order and numbered from 0 within each
     // volume; empty extents are neither shown nor counted. A volume whose reading fails keeps
     // the rows it already gave.
@@ -70,6 +65,6 @@ private:
 
 } // namespace
 
-NodePtr NewHLFSExtentList() { return New<HLFSExtentList>(); }
+NodePtr NewHLFSExtentList() { return New<HLFSExtentList>(kHLFSExtentListDecl); }
 
 } // namespace OrvaneCli::FileSystem

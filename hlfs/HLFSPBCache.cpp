@@ -54,31 +54,21 @@ std::array<int, kFieldCount> CacheFieldValues(const PointerBlockCacheStats& stat
     // An empty maximum has no usage to speak of (and must not be divided by).
     const std::uint64_t usage = stats.cacheSizeMax == 0 ? 0 : stats.cacheSize * 100 / stats.cacheSizeMax;
     return {
-        static_cast<int>(stats.capacityMissRatio),
-        static_cast<int>(stats.cacheSize >> kMiB),
-        static_cast<int>(stats.cacheSizeMax >> kMiB),
-        static_cast<int>(usage),
-        static_cast<int>(stats.workingSet >> kTiB),
-        static_cast<int>(stats.workingSetMax >> kTiB),
-        static_cast<int>(stats.heapOverhead >> kKiB),
-        static_cast<int>(heap.size >> kMiB),
+        static_cast<int>(stats.capacityMissRatio),    static_cast<int>(stats.cacheSize >> kMiB),
+        static_cast<int>(stats.cacheSizeMax >> kMiB), static_cast<int>(usage),
+        static_cast<int>(stats.workingSet >> kTiB),   static_cast<int>(stats.workingSetMax >> kTiB),
+        static_cast<int>(stats.heapOverhead >> kKiB), static_cast<int>(heap.size >> kMiB),
         static_cast<int>(heap.maxSize >> kMiB),
     };
 }
 
+const CommandDecl kHLFSPBCacheGetDecl = {
+    .description = "Get HLFS Pointer Block cache statistics.", .result = One(kColumns), .formatter = "simple"};
+
 // storage hlfs pbcache get
 class HLFSPBCacheGet final : public StorageCommand {
-public:
-    HLFSPBCacheGet()
-        : StorageCommand({
-              .description = "Get HLFS Pointer Block cache statistics.",
-              .result = One(kColumns),
-              .formatter = "simple",
-          })
-    {
-    }
+    using StorageCommand::StorageCommand;
 
-private:
     void Run(const InputPtr&, const OutputPtr& out) override
     {
         Guarded(out, [&] {
@@ -105,12 +95,12 @@ private:
     }
 };
 
+const CommandDecl kHLFSPBCacheResetDecl = {"Reset the HLFS Pointer Block cache statistics."};
+
 // storage hlfs pbcache reset
 class HLFSPBCacheReset final : public StorageCommand {
-public:
-    HLFSPBCacheReset() : StorageCommand({"Reset the HLFS Pointer Block cache statistics."}) {}
+    using StorageCommand::StorageCommand;
 
-private:
     void Run(const InputPtr&, const OutputPtr& out) override
     {
         Guarded(out, [&] {
@@ -122,7 +112,7 @@ private:
 
 } // namespace
 
-NodePtr NewHLFSPBCacheGet() { return New<HLFSPBCacheGet>(); }
-NodePtr NewHLFSPBCacheReset() { return New<HLFSPBCacheReset>(); }
+NodePtr NewHLFSPBCacheGet() { return New<HLFSPBCacheGet>(kHLFSPBCacheGetDecl); }
+NodePtr NewHLFSPBCacheReset() { return New<HLFSPBCacheReset>(kHLFSPBCacheResetDecl); }
 
 } // namespace OrvaneCli::FileSystem

@@ -25,55 +25,44 @@ constexpr std::int64_t kMaxGranularity = std::numeric_limits<std::uint32_t>::max
 constexpr std::int64_t kMinBandwidth = std::numeric_limits<std::int32_t>::min();
 constexpr std::int64_t kMaxBandwidth = std::numeric_limits<std::int32_t>::max();
 
-const ColumnTable kColumns("HlfsReclaim", {
-                                              {kGranularityField, "Reclaim Granularity", ColumnType::Int, {.unit = "Bytes"}},
-                                              {kPriorityField, "Reclaim Priority", ColumnType::String},
-                                              {kMethodField, "Reclaim Method", ColumnType::String},
-                                              {kBandwidthField, "Reclaim Bandwidth", ColumnType::Int, {.unit = "MB/s"}},
-                                          });
+const ColumnTable kColumns("HlfsReclaim",
+                           {
+                               {kGranularityField, "Reclaim Granularity", ColumnType::Int, {.unit = "Bytes"}},
+                               {kPriorityField, "Reclaim Priority", ColumnType::String},
+                               {kMethodField, "Reclaim Method", ColumnType::String},
+                               {kBandwidthField, "Reclaim Bandwidth", ColumnType::Int, {.unit = "MB/s"}},
+                           });
+
+const CommandDecl kHLFSReclaimConfigGetDecl = {.description = "Get space reclamation configuration parameters",
+                                               .result = One(kColumns),
+                                               .formatter = "simple",
+                                               .parameters = {HlfsLabelParameter(), HlfsUuidParameter()}};
 
 // storage hlfs reclaim config get
 class HLFSReclaimConfigGet final : public StorageCommand {
-public:
-    HLFSReclaimConfigGet()
-        : StorageCommand({
-              .description = "Get space reclamation configuration parameters",
-              .result = One(kColumns),
-              .formatter = "simple",
-              .parameters = {HlfsLabelParameter(), HlfsUuidParameter()},
-          })
-    {
-    }
+    using StorageCommand::StorageCommand;
 
-private:
     void Run(const InputPtr& in, const OutputPtr& out) override;
 };
 
+const CommandDecl kHLFSReclaimConfigSetDecl = {
+    .description = "Set space reclamation configuration parameters",
+    .parameters = {
+        HlfsLabelParameter(),
+        HlfsUuidParameter(),
+        {kGranularityParameter, "g", ParameterType::Int, "Minimum granularity of automatic space reclamation in bytes"},
+        {kPriorityParameter, "p", ParameterType::String,
+         "Priority of automatic space reclamation. Supported options are %ENUM%.", false,
+         StringEnum({{"none", ""}, {"low", ""}, {"medium", ""}, {"high", ""}})},
+        {kMethodParameter, "m", ParameterType::String,
+         "Method of automatic space reclamation.  Supported options are %ENUM%.", false,
+         StringEnum({{kMethodPriority, ""}, {kMethodFixed, ""}})},
+        {kBandwidthParameter, "b", ParameterType::Int, "Space reclamation fixed bandwidth (MB/s)"}}};
+
 // storage hlfs reclaim config set
 class HLFSReclaimConfigSet final : public StorageCommand {
-public:
-    HLFSReclaimConfigSet()
-        : StorageCommand({
-              .description = "Set space reclamation configuration parameters",
-              .parameters =
-                  {
-                      HlfsLabelParameter(),
-                      HlfsUuidParameter(),
-                      {kGranularityParameter, "g", ParameterType::Int,
-                       "Minimum granularity of automatic space reclamation in bytes"},
-                      {kPriorityParameter, "p", ParameterType::String,
-                       "Priority of automatic space reclamation. Supported options are %ENUM%.", false,
-                       StringEnum({{"none", ""}, {"low", ""}, {"medium", ""}, {"high", ""}})},
-                      {kMethodParameter, "m", ParameterType::String,
-                       "Method of automatic space reclamation.  Supported options are %ENUM%.", false,
-                       StringEnum({{kMethodPriority, ""}, {kMethodFixed, ""}})},
-                      {kBandwidthParameter, "b", ParameterType::Int, "Space reclamation fixed bandwidth (MB/s)"},
-                  },
-          })
-    {
-    }
+    using StorageCommand::StorageCommand;
 
-private:
     void Run(const InputPtr& in, const OutputPtr& out) override;
 };
 
@@ -81,12 +70,8 @@ private:
 
 void HLFSReclaimConfigGet::Run(const InputPtr& in, const OutputPtr& out)
 {
-    const std::unique_ptr<HlFileSystem> volume = GetSingleHLFSVolume(in, out);
-    if (!volume) {
-        return;
-    }
-    Guarded(out, [&] {
-        const HlfsVolumeUnmapProperty property = volume->GetUnmapProperty();
+    WithSingleHLFSVolume(in, out, [&](HlFileSystem& volume) {
+        const HlfsVolumeUnmapProperty property = volume.GetUnmapProperty();
         const RowShape shape = Rows();
         auto structure = shape.NewRow();
         structure.Set(kGranularityField, static_cast<long>(property.granularity));
@@ -100,11 +85,7 @@ void HLFSReclaimConfigGet::Run(const InputPtr& in, const OutputPtr& out)
 void HLFSReclaimConfigSet::Run(const InputPtr& in, const OutputPtr& out)
 {
     // The volume comes first: a selection error hides any parameter error.
-    const std::unique_ptr<HlFileSystem> volume = GetSingleHLFSVolume(in, out);
-    if (!volume) {
-        return;
-    }
-    Guarded(out, [&] {
+    WithSingleHLFSVolume(in, out, [&](HlFileSystem& volume) {
         const bool granularityGiven = in->HasParameter(kGranularityParameter);
         const std::string priority = in->GetParameter(kPriorityParameter);
         const std::string method = in->GetParameter(kMethodParameter);
@@ -159,12 +140,12 @@ void HLFSReclaimConfigSet::Run(const InputPtr& in, const OutputPtr& out)
             return;
         }
 
-        volume->SetUnmapProperty(property);
+        volume.SetUnmapProperty(property);
         out->SetRootObject(MetaBool::New(true));
     });
 }
 
-NodePtr NewHLFSReclaimConfigGet() { return New<HLFSReclaimConfigGet>(); }
-NodePtr NewHLFSReclaimConfigSet() { return New<HLFSReclaimConfigSet>(); }
+NodePtr NewHLFSReclaimConfigGet() { return New<HLFSReclaimConfigGet>(kHLFSReclaimConfigGetDecl); }
+NodePtr NewHLFSReclaimConfigSet() { return New<HLFSReclaimConfigSet>(kHLFSReclaimConfigSetDecl); }
 
 } // namespace OrvaneCli::FileSystem

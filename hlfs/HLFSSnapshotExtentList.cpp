@@ -20,27 +20,22 @@ const ColumnTable kColumns("HLFSSnapshotExtent", {
                                                      {kEnd, "End", ColumnType::Int},
                                                  });
 
+const CommandDecl kHLFSSnapshotExtentListDecl = {
+    .description = "List extents of unresolved snapshots/replicas of HLFS volume.",
+    .result = ListOf(kColumns),
+    .formatter = "table",
+    .parameters = {LabelParameter("The HLFS volume label of the target snapshot to enumerate."),
+                   UuidParameter("The HLFS volume uuid of the target snapshot to enumerate.")}};
+
 // storage hlfs snapshot extent list
 class HLFSSnapshotExtentList final : public StorageCommand {
-public:
-    HLFSSnapshotExtentList()
-        : StorageCommand({
-              .description = "List extents of unresolved snapshots/replicas of HLFS volume.",
-              .result = ListOf(kColumns),
-              .formatter = "table",
-              .parameters = {LabelParameter("The HLFS volume label of the target snapshot to enumerate."),
-                             UuidParameter("The HLFS volume uuid of the target snapshot to enumerate.")},
-          })
-    {
-    }
+    using StorageCommand::StorageCommand;
 
-private:
     void Run(const InputPtr& in, const OutputPtr& out) override
     {
-        const RowShape shape = Rows();
-        auto list = shape.EmptyList();
         // Outer scope: a failure listing the copies, their extents or the selection ends the walk.
-        ForEachSelectedSnapshot(in, out, [&](UnresolvedHlfsVolumeImpl& volume) {
+        const RowShape shape = Rows();
+        ListSelectedSnapshots(in, out, shape.EmptyList(), [&](UnresolvedHlfsVolumeImpl& volume, MetaList& list) {
             const auto extents = volume.GetExtents();
             // Inner scope: a failure on one extent drops the rest of this copy's extents only.
             Guarded(out, [&] {
@@ -59,16 +54,15 @@ private:
                     row.Set(kPartition, static_cast<int>(extent->GetPartition()));
                     row.Set(kStart, static_cast<long>(extent->GetStart()));
                     row.Set(kEnd, static_cast<long>(extent->GetEnd()));
-                    list->Add(row.Structure());
+                    list.Add(row.Structure());
                 }
             });
         });
-        out->SetRootObject(list);
     }
 };
 
 } // namespace
 
-NodePtr NewHLFSSnapshotExtentList() { return New<HLFSSnapshotExtentList>(); }
+NodePtr NewHLFSSnapshotExtentList() { return New<HLFSSnapshotExtentList>(kHLFSSnapshotExtentListDecl); }
 
 } // namespace OrvaneCli::FileSystem

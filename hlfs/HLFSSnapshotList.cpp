@@ -27,27 +27,22 @@ std::string ReasonColumn(bool passed, unsigned code)
     return passed ? std::string() : std::string(TranslateSnapshotReason(code));
 }
 
+const CommandDecl kHLFSSnapshotListDecl = {
+    .description = "List unresolved snapshots/replicas of HLFS volume.",
+    .result = ListOf(kColumns),
+    .formatter = "simple",
+    .parameters = {LabelParameter("The HLFS volume label of the snapshot to list."),
+                   UuidParameter("The HLFS volume uuid of the snapshot to list.")}};
+
 // storage hlfs snapshot list
 class HLFSSnapshotList final : public StorageCommand {
-public:
-    HLFSSnapshotList()
-        : StorageCommand({
-              .description = "List unresolved snapshots/replicas of HLFS volume.",
-              .result = ListOf(kColumns),
-              .formatter = "simple",
-              .parameters = {LabelParameter("The HLFS volume label of the snapshot to list."),
-                             UuidParameter("The HLFS volume uuid of the snapshot to list.")},
-          })
-    {
-    }
+    using StorageCommand::StorageCommand;
 
-private:
     void Run(const InputPtr& in, const OutputPtr& out) override
     {
         const RowShape shape = Rows();
-        auto list = shape.EmptyList();
         // A host failure ends the walk; the rows gathered so far are still shown.
-        ForEachSelectedSnapshot(in, out, [&](UnresolvedHlfsVolumeImpl& volume) {
+        ListSelectedSnapshots(in, out, shape.EmptyList(), [&](UnresolvedHlfsVolumeImpl& volume, MetaList& list) {
             auto row = shape.NewRow();
             row.Set(kVolumeName, volume.GetVolumeName());
             row.Set(kHlfsUuid, volume.GetUuid());
@@ -63,14 +58,13 @@ private:
             row.Set(kResignatureReason, ReasonColumn(canResignature, code));
 
             row.Set(kExtentCount, static_cast<long>(volume.GetExtents().size()));
-            list->Add(row.Structure());
+            list.Add(row.Structure());
         });
-        out->SetRootObject(list);
     }
 };
 
 } // namespace
 
-NodePtr NewHLFSSnapshotList() { return New<HLFSSnapshotList>(); }
+NodePtr NewHLFSSnapshotList() { return New<HLFSSnapshotList>(kHLFSSnapshotListDecl); }
 
 } // namespace OrvaneCli::FileSystem

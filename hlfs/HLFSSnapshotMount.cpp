@@ -6,24 +6,17 @@ namespace OrvaneCli::FileSystem {
 
 namespace {
 
+const CommandDecl kHLFSSnapshotMountDecl = {
+    .description = "Mount a snapshot/replica of a HLFS volume.",
+    .parameters = {LabelParameter("The HLFS volume label of the snapshot to mount."),
+                   UuidParameter("The HLFS volume uuid of the snapshot to mount."),
+                   {kOptionNoPersist, "n", ParameterType::Flag,
+                    "Mount the volume non-persistently; the volume will not be automounted after a restart."}}};
+
 // storage hlfs snapshot mount
 class HLFSSnapshotMount final : public StorageCommand {
-public:
-    HLFSSnapshotMount()
-        : StorageCommand({
-              .description = "Mount a snapshot/replica of a HLFS volume.",
-              .parameters =
-                  {
-                      LabelParameter("The HLFS volume label of the snapshot to mount."),
-                      UuidParameter("The HLFS volume uuid of the snapshot to mount."),
-                      {kOptionNoPersist, "n", ParameterType::Flag,
-                       "Mount the volume non-persistently; the volume will not be automounted after a restart."},
-                  },
-          })
-    {
-    }
+    using StorageCommand::StorageCommand;
 
-private:
     void Run(const InputPtr& in, const OutputPtr& out) override
     {
         const bool persistent = !in->IsFlagSet(kOptionNoPersist);
@@ -34,6 +27,6 @@ private:
 
 } // namespace
 
-NodePtr NewHLFSSnapshotMount() { return New<HLFSSnapshotMount>(); }
+NodePtr NewHLFSSnapshotMount() { return New<HLFSSnapshotMount>(kHLFSSnapshotMountDecl); }
 
 } // namespace OrvaneCli::FileSystem

@@ -6,17 +6,15 @@ namespace OrvaneCli::FileSystem {
 
 namespace {
 
+const CommandDecl kHLFSSnapshotResignatureDecl = {
+    .description = "Resignature a snapshot/replica of a HLFS volume.",
+    .parameters = {LabelParameter("The HLFS volume label of the snapshot to resignature."),
+                   UuidParameter("The HLFS volume uuid of the snapshot to resignature.")}};
+
 // storage hlfs snapshot resignature
 class HLFSSnapshotResignature final : public StorageCommand {
-public:
-    HLFSSnapshotResignature()
-        : StorageCommand({.description = "Resignature a snapshot/replica of a HLFS volume.",
-                          .parameters = {LabelParameter("The HLFS volume label of the snapshot to resignature."),
-                                         UuidParameter("The HLFS volume uuid of the snapshot to resignature.")}})
-    {
-    }
+    using StorageCommand::StorageCommand;
 
-private:
     void Run(const InputPtr& in, const OutputPtr& out) override
     {
         ResolveMatchingSnapshots(in, out, [&](UnresolvedHlfsVolumeImpl& volume) {
@@ -34,6 +32,6 @@ private:
 
 } // namespace
 
-NodePtr NewHLFSSnapshotResignature() { return New<HLFSSnapshotResignature>(); }
+NodePtr NewHLFSSnapshotResignature() { return New<HLFSSnapshotResignature>(kHLFSSnapshotResignatureDecl); }
 
 } // namespace OrvaneCli::FileSystem

@@ -27,54 +27,40 @@ const ColumnTable kColumns("VolumeLockModeInUse", {
                                                       {kStatus, "Status", ColumnType::String},
                                                   });
 
+const CommandDecl kHLFSVolumeHostListDecl = {
+    .description = "List hosts accessing a particular HLFS Volume.",
+    .result = ListOf(kColumns),
+    .formatter = "table",
+    .examples = {{"-l datastore1", "List hosts using volume 'datastore1' with default liveness check of 'none'."},
+                 {"-l datastore1 -v quick", "List hosts using volume 'datastore1' with liveness check of 'quick'."}},
+    .parameters = {HlfsLabelParameter(),
+                   HlfsUuidParameter(),
+                   {kLiveness, "v", ParameterType::String,
+                    "The type of liveness check to perform on the HLFS volume. Valid values are %ENUM% (default is "
+                    "none).",
+                    false,
+                    StringEnum({{"none", "No liveness check, just scan heartbeats (default)"},
+                                {"quick", "Quick liveness check, wait for one heartbeat interval"}})}}};
+
 // storage hlfs host list
 class HLFSVolumeHostList final : public StorageCommand {
-public:
-    HLFSVolumeHostList()
-        : StorageCommand({
-              .description = "List hosts accessing a particular HLFS Volume.",
-              .result = ListOf(kColumns),
-              .formatter = "table",
-              .examples =
-                  {
-                      {"-l datastore1", "List hosts using volume 'datastore1' with default liveness check of 'none'."},
-                      {"-l datastore1 -v quick", "List hosts using volume 'datastore1' with liveness check of 'quick'."},
-                  },
-              .parameters =
-                  {
-                      HlfsLabelParameter(),
-                      HlfsUuidParameter(),
-                      {kLiveness, "v", ParameterType::String,
-                       "The type of liveness check to perform on the HLFS volume. Valid values are %ENUM% (default is "
-                       "none).",
-                       false,
-                       StringEnum({{"none", "No liveness check, just scan heartbeats (default)"},
-                                   {"quick", "Quick liveness check, wait for one heartbeat interval"}})},
-                  },
-          })
-    {
-    }
+    using StorageCommand::StorageCommand;
 
-private:
     void Run(const InputPtr& in, const OutputPtr& out) override
     {
         const bool quick = in->GetParameter(kLiveness) == "quick";
-        const std::unique_ptr<HlFileSystem> volume = GetSingleHLFSVolume(in, out);
-        if (!volume) {
-            return;
-        }
-        Guarded(out, [&] {
+        WithSingleHLFSVolume(in, out, [&](HlFileSystem& volume) {
             const RowShape shape = Rows();
             auto list = shape.EmptyList();
-            for (const HlfsUserInfo& record : volume->GetUsers(quick)) {
+            for (const HlfsUserInfo& record : volume.GetUsers(quick)) {
                 auto row = shape.NewRow();
                 row.Set(kHeartbeatUuid, record.heartbeatUuid);
                 row.Set(kMacAddress, record.macAddress.GetStringAddress());
-                row.Set(kDriverVersion, std::to_string(record.driverVersionMajor) + "." +
-                                            std::to_string(record.driverVersionMinor));
+                row.Set(kDriverVersion,
+                        std::to_string(record.driverVersionMajor) + "." + std::to_string(record.driverVersionMinor));
                 row.Set(kHeartbeatOffset, static_cast<long>(record.heartbeatOffset));
                 row.Set(kLockingMode, TranslateLockModeInUse(record.lockModeInUse));
-                row.Set(kStatus, TranslateStatus(volume->GetLockMode(), record.lockModeInUse));
+                row.Set(kStatus, TranslateStatus(volume.GetLockMode(), record.lockModeInUse));
                 list->Add(row.Structure());
             }
             out->SetRootObject(list);
@@ -113,6 +99,6 @@ const char* TranslateStatus(unsigned int volumeMode, unsigned char hostMode)
     return hostAtsOnly == atsOnly ? kNormal : kInvalid;
 }
 
-NodePtr NewHLFSVolumeHostList() { return New<HLFSVolumeHostList>(); }
+NodePtr NewHLFSVolumeHostList() { return New<HLFSVolumeHostList>(kHLFSVolumeHostListDecl); }
 
 } // namespace OrvaneCli::FileSystem

@@ -113,32 +113,25 @@ bool GetMultipleHLFSVolumes(const InputPtr& in, const OutputPtr& out,
     return ok || ignore;
 }
 
+const CommandDecl kHLFSVolumeLockModeListDecl = {
+    .description = "List the on-disk critical section locking mode for HLFS volumes available on this host.",
+    .result = ListOf(kColumns),
+    .formatter = "table",
+    .examples = {{"", "Show lockmodes for all HLFS volumes."},
+                 {"-l datastore1", "Show lockmode for HLFS volume with label 'datastore1'."},
+                 {"-l datastore1 -l datastore2",
+                  "Show lockmodes for HLFS volume with label 'datastore1' and HLFS volume with label 'datastore2'."},
+                 {"-l datastore1 -u 50ac1b12-6b9eebe0-6765-80c16e6d3408",
+                  "Show lockmodes for HLFS volume with label 'datastore1' and HLFS volume with uuid "
+                  "'50ac1b12-6b9eebe0-6765-80c16e6d3408'."}},
+    .parameters = {LabelParameter("The label of the target HLFS volume.", ParameterType::StringList),
+                   UuidParameter("The uuid of the target HLFS volume.", ParameterType::StringList),
+                   IgnoreErrorsParameter()}};
+
 // storage hlfs lockmode list
 class HLFSVolumeLockModeList final : public StorageCommand {
-public:
-    HLFSVolumeLockModeList()
-        : StorageCommand(
-              {.description = "List the on-disk critical section locking mode for HLFS volumes available on this host.",
-               .result = ListOf(kColumns),
-               .formatter = "table",
-               .examples = {
-                   {"", "Show lockmodes for all HLFS volumes."},
-                   {"-l datastore1", "Show lockmode for HLFS volume with label 'datastore1'."},
-                   {"-l datastore1 -l datastore2",
-                    "Show lockmodes for HLFS volume with label 'datastore1' and HLFS volume with label 'datastore2'."},
-                   {"-l datastore1 -u 50ac1b12-6b9eebe0-6765-80c16e6d3408",
-                    "Show lockmodes for HLFS volume with label 'datastore1' and HLFS volume with uuid "
-                    "'50ac1b12-6b9eebe0-6765-80c16e6d3408'."},
-               },
-               .parameters = {
-                   LabelParameter("The label of the target HLFS volume.", ParameterType::StringList),
-                   UuidParameter("The uuid of the target HLFS volume.", ParameterType::StringList),
-                   IgnoreErrorsParameter(),
-               }})
-    {
-    }
+    using StorageCommand::StorageCommand;
 
-private:
     void Run(const InputPtr& in, const OutputPtr& out) override
     {
         const SkipReport report{"Error getting data for filesystem on '", &HostCtl::Storage::FileSystem::GetMountPoint,
@@ -172,30 +165,20 @@ const VolumeSelectorTexts kLockModeTexts = {"You cannot specify both --ats and -
                                             "The requested lockmode must be specified either by --ats or --scsi.",
                                             nullptr, nullptr};
 
+const CommandDecl kHLFSVolumeLockModeSetDecl = {
+    .description = "Update the on-disk critical section locking mode for a particular HLFS Volume.",
+    .examples = {{"-a -l datastore1", "Configure HLFS volume with label 'datastore1'for ATS-only locking."},
+                 {"-s -u 50ac1b12-6b9eebe0-6765-80c16e6d3408",
+                  "Configure HLFS volume with uuid '50ac1b12-6b9eebe0-6765-80c16e6d3408' for SCSI locking."}},
+    .parameters = {HlfsLabelParameter(),
+                   HlfsUuidParameter(),
+                   {kAts, "a", ParameterType::Flag, "Enable ATS-only locking."},
+                   {kScsi, "s", ParameterType::Flag, "Enable SCSI locking."}}};
+
 // storage hlfs lockmode set
 class HLFSVolumeLockModeSet final : public StorageCommand {
-public:
-    HLFSVolumeLockModeSet()
-        : StorageCommand({
-              .description = "Update the on-disk critical section locking mode for a particular HLFS Volume.",
-              .examples =
-                  {
-                      {"-a -l datastore1", "Configure HLFS volume with label 'datastore1'for ATS-only locking."},
-                      {"-s -u 50ac1b12-6b9eebe0-6765-80c16e6d3408",
-                       "Configure HLFS volume with uuid '50ac1b12-6b9eebe0-6765-80c16e6d3408' for SCSI locking."},
-                  },
-              .parameters =
-                  {
-                      HlfsLabelParameter(),
-                      HlfsUuidParameter(),
-                      {kAts, "a", ParameterType::Flag, "Enable ATS-only locking."},
-                      {kScsi, "s", ParameterType::Flag, "Enable SCSI locking."},
-                  },
-          })
-    {
-    }
+    using StorageCommand::StorageCommand;
 
-private:
     void Run(const InputPtr& in, const OutputPtr& out) override
     {
         const bool ats = in->IsFlagSet(kAts);
@@ -203,18 +186,14 @@ private:
         if (!ExactlyOneOf({{ats, kLockModeTexts.both}, {scsi, kLockModeTexts.both}}, kLockModeTexts.neither, out)) {
             return;
         }
-        const std::unique_ptr<HlFileSystem> volume = GetSingleHLFSVolume(in, out);
-        if (!volume) {
-            return;
-        }
-        Guarded(out, [&] {
+        WithSingleHLFSVolume(in, out, [&](HlFileSystem& volume) {
             // Only the ATS-only bit changes; pending bits are carried over as they are.
-            const unsigned mode = volume->GetLockMode();
+            const unsigned mode = volume.GetLockMode();
             const bool atsOnly = (mode & LockModeBits::AtsOnly) != 0;
             if (ats && !atsOnly) {
-                volume->SetLockMode(mode | LockModeBits::AtsOnly);
+                volume.SetLockMode(mode | LockModeBits::AtsOnly);
             } else if (scsi && atsOnly) {
-                volume->SetLockMode(mode & ~LockModeBits::AtsOnly);
+                volume.SetLockMode(mode & ~LockModeBits::AtsOnly);
             }
             out->SetRootObject(MetaBool::New(true));
         });
@@ -237,8 +216,7 @@ const char* TranslateLockMode(unsigned mode)
     return "ATS+SCSI";
 }
 
-NodePtr NewHLFSVolumeLockModeList() { return New<HLFSVolumeLockModeList>(); }
-NodePtr NewHLFSVolumeLockModeSet() { return New<HLFSVolumeLockModeSet>(); }
+NodePtr NewHLFSVolumeLockModeList() { return New<HLFSVolumeLockModeList>(kHLFSVolumeLockModeListDecl); }
+NodePtr NewHLFSVolumeLockModeSet() { return New<HLFSVolumeLockModeSet>(kHLFSVolumeLockModeSetDecl); }
 
 } // namespace OrvaneCli::FileSystem
-

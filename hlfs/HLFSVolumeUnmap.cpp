@@ -15,24 +15,17 @@ constexpr std::int64_t kDefaultReclaimUnit = 200;
 // The host counts blocks per iteration in an unsigned 32-bit value.
 constexpr std::int64_t kMaxReclaimUnit = std::numeric_limits<std::uint32_t>::max();
 
+const CommandDecl kHLFSVolumeUnmapDecl = {
+    .description = "Reclaim the space by unmapping free blocks from HLFS Volume",
+    .parameters = {LabelParameter("The label of the HLFS volume to unmap the free blocks."),
+                   UuidParameter("The uuid of the HLFS volume to unmap the free blocks."),
+                   {kReclaimUnitParameter, "n", ParameterType::Int,
+                    "Number of HLFS blocks that should be unmapped per iteration."}}};
+
 // storage hlfs unmap
 class HLFSVolumeUnmap final : public StorageCommand {
-public:
-    HLFSVolumeUnmap()
-        : StorageCommand({
-              .description = "Reclaim the space by unmapping free blocks from HLFS Volume",
-              .parameters =
-                  {
-                      LabelParameter("The label of the HLFS volume to unmap the free blocks."),
-                      UuidParameter("The uuid of the HLFS volume to unmap the free blocks."),
-                      {kReclaimUnitParameter, "n", ParameterType::Int,
-                       "Number of HLFS blocks that should be unmapped per iteration."},
-                  },
-          })
-    {
-    }
+    using StorageCommand::StorageCommand;
 
-private:
     void Run(const InputPtr& in, const OutputPtr& out) override;
 };
 
@@ -67,6 +60,6 @@ void HLFSVolumeUnmap::Run(const InputPtr& in, const OutputPtr& out)
     });
 }
 
-NodePtr NewHLFSVolumeUnmap() { return New<HLFSVolumeUnmap>(); }
+NodePtr NewHLFSVolumeUnmap() { return New<HLFSVolumeUnmap>(kHLFSVolumeUnmapDecl); }
 
 } // namespace OrvaneCli::FileSystem

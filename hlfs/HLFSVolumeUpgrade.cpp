@@ -13,17 +13,14 @@ const VolumeSelectorTexts kChosenVolumeTexts = {
 
 namespace {
 
+const CommandDecl kHLFSVolumeUpgradeDecl = {.description = "Upgrade a HLFS3 volume to HLFS5.",
+                                            .parameters = {LabelParameter("The label of the HLFS volume to upgrade."),
+                                                           UuidParameter("The uuid of the HLFS volume to upgrade.")}};
+
 // storage hlfs upgrade
 class HLFSVolumeUpgrade final : public StorageCommand {
-public:
-    HLFSVolumeUpgrade()
-        : StorageCommand({.description = "Upgrade a HLFS3 volume to HLFS5.",
-                          .parameters = {LabelParameter("The label of the HLFS volume to upgrade."),
-                                         UuidParameter("The uuid of the HLFS volume to upgrade.")}})
-    {
-    }
+    using StorageCommand::StorageCommand;
 
-private:
     void Run(const InputPtr& in, const OutputPtr& out) override
     {
         WithChosenVolume(in, out, [&](HlFileSystemImpl& volume, const std::string&) {
@@ -36,6 +33,6 @@ private:
 
 } // namespace
 
-NodePtr NewHLFSVolumeUpgrade() { return New<HLFSVolumeUpgrade>(); }
+NodePtr NewHLFSVolumeUpgrade() { return New<HLFSVolumeUpgrade>(kHLFSVolumeUpgradeDecl); }
 
 } // namespace OrvaneCli::FileSystem

@@ -18,15 +18,17 @@ NamespacePtr HlfsNamespace()
                                            {"extent", MakeNamespace("Manage HLFS snapshot extents.",
                                                                     {{"list", NewHLFSSnapshotExtentList()}})},
                                        })},
-            {"lockmode", MakeNamespace("Manage HLFS array locking mode.", {
-                                                                              {"list", NewHLFSVolumeLockModeList()},
-                                                                              {"set", NewHLFSVolumeLockModeSet()},
-                                                                          })},
+            {"lockmode", MakeNamespace("Manage HLFS array locking mode.",
+                                       {
+                                           {"list", NewHLFSVolumeLockModeList()},
+                                           {"set", NewHLFSVolumeLockModeSet()},
+                                       })},
             {"host", MakeNamespace("Manage hosts accessing a HLFS volume.", {{"list", NewHLFSVolumeHostList()}})},
-            {"pbcache", MakeNamespace("HLFS Pointer Block Cache statistics.", {
-                                                                                  {"get", NewHLFSPBCacheGet()},
-                                                                                  {"reset", NewHLFSPBCacheReset()},
-                                                                              })},
+            {"pbcache", MakeNamespace("HLFS Pointer Block Cache statistics.",
+                                      {
+                                          {"get", NewHLFSPBCacheGet()},
+                                          {"reset", NewHLFSPBCacheReset()},
+                                      })},
             {"reclaim", MakeNamespace("Manage HLFS Space Reclamation",
                                       {{"config", MakeNamespace("HLFS Space Reclamation Configuration Settings",
                                                                 {

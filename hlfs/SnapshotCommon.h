@@ -53,6 +53,15 @@ void ForEachSelectedSnapshot(const InputPtr& in, const OutputPtr& out, Each&& ea
     });
 }
 
+// The two snapshot listings: `each(copy, list)` adds the rows of every selected copy; the
+// list is the result, also when a host failure ended the walk.
+template <typename Each>
+void ListSelectedSnapshots(const InputPtr& in, const OutputPtr& out, const std::shared_ptr<MetaList>& list, Each&& each)
+{
+    ForEachSelectedSnapshot(in, out, [&](UnresolvedHlfsVolumeImpl& volume) { each(volume, *list); });
+    out->SetRootObject(list);
+}
+
 // The texts of the snapshot mount and resignature selection.
 extern const VolumeSelectorTexts kResolveSnapshotTexts;
 

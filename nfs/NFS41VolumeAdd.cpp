@@ -28,15 +28,13 @@ NetworkFileSystem::SecurityType ToSecurityType(const std::string& flavour)
     return NetworkFileSystem::SEC_SYS;
 }
 
+const CommandDecl kNFS41VolumeAddDecl = {
+    "Add a new NFS v4.1 volume to the Zephal Host and mount it with the given volume name."};
+
 // storage nfs41 add
 class NFS41VolumeAdd final : public StorageCommand {
-public:
-    NFS41VolumeAdd()
-        : StorageCommand({"Add a new NFS v4.1 volume to the Zephal Host and mount it with the given volume name."})
-    {
-    }
+    using StorageCommand::StorageCommand;
 
-private:
     void DeclareParameters(const std::shared_ptr<InputSpec>& inputs) override;
     void Run(const InputPtr& in, const OutputPtr& out) override;
 };
@@ -48,24 +46,24 @@ void NFS41VolumeAdd::DeclareParameters(const std::shared_ptr<InputSpec>& inputs)
     const bool knxnicBinding = IsFeatureEnabled(Feature::Nfs41KnxnicBinding);
     if (knxnicBinding) {
         AddParameter(inputs, {kOptionHostKnxnic, "I", ParameterType::StringList,
-                            "The hostname or IP address followed by a colon(:) and knxnic name. This parameter can "
-                            "be specified more than once. E.g.: --host-knxnic=host1:knxnic1 "
-                            "--host-knxnic=ip2:knxnic2"});
+                              "The hostname or IP address followed by a colon(:) and knxnic name. This parameter can "
+                              "be specified more than once. E.g.: --host-knxnic=host1:knxnic1 "
+                              "--host-knxnic=ip2:knxnic2"});
     }
     AddParameter(inputs, {kHosts, "H", ParameterType::StringList,
-                        "The hostname(s) or IP address(es) (comma-separated) of the server for the NFS v4.1 volume "
-                        "to add and mount on the system.",
-                        !knxnicBinding});
+                          "The hostname(s) or IP address(es) (comma-separated) of the server for the NFS v4.1 volume "
+                          "to add and mount on the system.",
+                          !knxnicBinding});
     AddParameter(inputs,
                  {NfsAddArg::kIsPE, "p", ParameterType::Flag, "If set, this flag will set the mount point to be PE."});
     AddParameter(inputs, {NfsAddArg::kShare, "s", ParameterType::String,
-                        "The share name on the remote system to use for this NFS v4.1 mount point.", true});
+                          "The share name on the remote system to use for this NFS v4.1 mount point.", true});
     AddParameter(inputs, {kOptionVolumeName, "v", ParameterType::String,
-                        "The volume name to use for the NFS v4.1 mount.  This must be a unique volume name and "
-                        "cannot conflict with existing NAS, NFS v4.1, HLFS, or other volume names.",
-                        true});
+                          "The volume name to use for the NFS v4.1 mount.  This must be a unique volume name and "
+                          "cannot conflict with existing NAS, NFS v4.1, HLFS, or other volume names.",
+                          true});
     AddParameter(inputs, {NfsAddArg::kReadOnly, "r", ParameterType::Flag,
-                        "If set, this flag will make the mount point be read-only."});
+                          "If set, this flag will make the mount point be read-only."});
     AddParameter(
         inputs,
         {kSecurity, "a", ParameterType::String, "Security flavors. Acceptable values are: %ENUM%.", false,
@@ -118,6 +116,6 @@ void NFS41VolumeAdd::Run(const InputPtr& in, const OutputPtr& out)
     });
 }
 
-NodePtr NewNFS41VolumeAdd() { return New<NFS41VolumeAdd>(); }
+NodePtr NewNFS41VolumeAdd() { return New<NFS41VolumeAdd>(kNFS41VolumeAddDecl); }
 
 } // namespace OrvaneCli::FileSystem

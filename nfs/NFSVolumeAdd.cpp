@@ -45,15 +45,13 @@ std::optional<NfsServer> ReadServer(const InputPtr& in, const OutputPtr& out)
     return NfsServer{hostKnxnic.substr(0, colon), true, hostKnxnic.substr(colon + 1)};
 }
 
+const CommandDecl kNFSVolumeAddDecl = {
+    "Add a new NAS volume to the Zephal Host and mount it with the given volume name."};
+
 // storage nfs add
 class NFSVolumeAdd final : public StorageCommand {
-public:
-    NFSVolumeAdd()
-        : StorageCommand({"Add a new NAS volume to the Zephal Host and mount it with the given volume name."})
-    {
-    }
+    using StorageCommand::StorageCommand;
 
-private:
     void DeclareParameters(const std::shared_ptr<InputSpec>& inputs) override;
     void Run(const InputPtr& in, const OutputPtr& out) override;
 };
@@ -68,24 +66,24 @@ void NFSVolumeAdd::DeclareParameters(const std::shared_ptr<InputSpec>& inputs)
                   "The hostname or IP address of the NAS volume to add and mount on the system.", !knxnicBinding});
     if (knxnicBinding) {
         AddParameter(inputs, {kOptionHostKnxnic, "I", ParameterType::String,
-                            "The hostname or IP address of the NAS volume to add, followed by a colon(:) and knxnic "
-                            "name i.e. <host/IP>:<knxnic> "});
+                              "The hostname or IP address of the NAS volume to add, followed by a colon(:) and knxnic "
+                              "name i.e. <host/IP>:<knxnic> "});
     }
     AddParameter(inputs, {NfsAddArg::kShare, "s", ParameterType::String,
-                        "The share name on the remote system to use for this NAS mount point.", true});
+                          "The share name on the remote system to use for this NAS mount point.", true});
     AddParameter(inputs, {kOptionVolumeName, "v", ParameterType::String,
-                        "The volume name to use for the NAS mount.  This must be a unique volume name and cannot "
-                        "conflict with existing NAS, HLFS or other volume names.",
-                        true});
+                          "The volume name to use for the NAS mount.  This must be a unique volume name and cannot "
+                          "conflict with existing NAS, HLFS or other volume names.",
+                          true});
     if (IsFeatureEnabled(Feature::NfsConnections)) {
         AddParameter(inputs, {kOptionConnections, "c", ParameterType::Int,
-                            "The number of RPC connections to be established for the NFS datastore. Minimum and "
-                            "default values are 1 and maximum is 8. A higher number of connections yields better "
-                            "performance on datastores with higher IO load.",
-                            false, IntRange(1, 8)});
+                              "The number of RPC connections to be established for the NFS datastore. Minimum and "
+                              "default values are 1 and maximum is 8. A higher number of connections yields better "
+                              "performance on datastores with higher IO load.",
+                              false, IntRange(1, 8)});
     }
     AddParameter(inputs, {NfsAddArg::kReadOnly, "r", ParameterType::Flag,
-                        "If set this flag will set the mount point to be read-only."});
+                          "If set this flag will set the mount point to be read-only."});
     AddParameter(inputs,
                  {NfsAddArg::kIsPE, "p", ParameterType::Flag, "If set this flag will set the mount point to be PE."});
     AddParameter(inputs, {kMountRetry, "", ParameterType::Flag, ""});
@@ -138,6 +136,6 @@ void NFSVolumeAdd::Run(const InputPtr& in, const OutputPtr& out)
     });
 }
 
-NodePtr NewNFSVolumeAdd() { return New<NFSVolumeAdd>(); }
+NodePtr NewNFSVolumeAdd() { return New<NFSVolumeAdd>(kNFSVolumeAddDecl); }
 
 } // namespace OrvaneCli::FileSystem

@@ -37,65 +37,102 @@ const std::string& TranslateSecurity(NetworkFileSystem::SecurityType security)
 
 namespace {
 
-using VolumeQuery = std::vector<std::unique_ptr<NetworkFileSystem>> (*)(StorageInfoImpl& storage,
-                                                                         StorageInfoImpl::NetworkFileSystemFilter filter);
-
 const char* const kPeOnly = "pe-only";
-namespace V3 {
-enum Field { kVolumeName, kHost, kShare, kKnxnic, kConnections, kAccessible, kMounted, kReadOnly, kIsPE, kAcceleration };
-} // namespace V3
+// The fields of both lists; each version's table holds its own.
+enum Field {
+    kVolumeName,
+    kHost,
+    kHosts,
+    kShare,
+    kKnxnic,
+    kKnxnics,
+    kConnections,
+    kAccessible,
+    kMounted,
+    kReadOnly,
+    kSecurity,
+    kIsPE,
+    kAcceleration
+};
 
 const ColumnTable kV3Columns(
     "NasMount",
     {
-        {V3::kVolumeName, "Volume Name", ColumnType::String},
-        {V3::kHost, "Host", ColumnType::String},
-        {V3::kShare, "Share", ColumnType::String},
-        {V3::kKnxnic, "Knxnic", ColumnType::String, {.feature = Feature::NfsKnxnicBinding}},
-        {V3::kConnections, "Connections", ColumnType::Int,
-         {.feature = Feature::NfsConnections, .shownAfter = V3::kMounted}},
-        {V3::kAccessible, "Accessible", ColumnType::Bool},
-        {V3::kMounted, "Mounted", ColumnType::Bool},
-        {V3::kReadOnly, "Read-Only", ColumnType::Bool},
-        {V3::kIsPE, "isPE", ColumnType::Bool},
-        {V3::kAcceleration, "Hardware Acceleration", ColumnType::String},
+        {kVolumeName, "Volume Name", ColumnType::String},
+        {kHost, "Host", ColumnType::String},
+        {kShare, "Share", ColumnType::String},
+        {kKnxnic, "Knxnic", ColumnType::String, {.feature = Feature::NfsKnxnicBinding}},
+        {kConnections, "Connections", ColumnType::Int, {.feature = Feature::NfsConnections, .shownAfter = kMounted}},
+        {kAccessible, "Accessible", ColumnType::Bool},
+        {kMounted, "Mounted", ColumnType::Bool},
+        {kReadOnly, "Read-Only", ColumnType::Bool},
+        {kIsPE, "isPE", ColumnType::Bool},
+        {kAcceleration, "Hardware Acceleration", ColumnType::String},
     });
-
-namespace V41 {
-enum Field { kVolumeName, kHosts, kShare, kKnxnics, kAccessible, kMounted, kReadOnly, kSecurity, kIsPE, kAcceleration };
-} // namespace V41
 
 const ColumnTable kV41Columns("NasMount",
                               {
-                                  {V41::kVolumeName, "Volume Name", ColumnType::String},
-                                  {V41::kHosts, "Host(s)", ColumnType::String},
-                                  {V41::kShare, "Share", ColumnType::String},
-                                  {V41::kKnxnics, "Knxnics", ColumnType::String,
-                                   {.feature = Feature::Nfs41KnxnicBinding}},
-                                  {V41::kAccessible, "Accessible", ColumnType::Bool},
-                                  {V41::kMounted, "Mounted", ColumnType::Bool},
-                                  {V41::kReadOnly, "Read-Only", ColumnType::Bool},
-                                  {V41::kSecurity, "Security", ColumnType::String},
-                                  {V41::kIsPE, "isPE", ColumnType::Bool},
-                                  {V41::kAcceleration, "Hardware Acceleration", ColumnType::String},
+                                  {kVolumeName, "Volume Name", ColumnType::String},
+                                  {kHosts, "Host(s)", ColumnType::String},
+                                  {kShare, "Share", ColumnType::String},
+                                  {kKnxnics, "Knxnics", ColumnType::String, {.feature = Feature::Nfs41KnxnicBinding}},
+                                  {kAccessible, "Accessible", ColumnType::Bool},
+                                  {kMounted, "Mounted", ColumnType::Bool},
+                                  {kReadOnly, "Read-Only", ColumnType::Bool},
+                                  {kSecurity, "Security", ColumnType::String},
+                                  {kIsPE, "isPE", ColumnType::Bool},
+                                  {kAcceleration, "Hardware Acceleration", ColumnType::String},
                               });
 
-// The list of one NFS version: one row per volume the filter lets through; a volume that
-// cannot be read is reported and left out.
-class NfsListCommand : public StorageCommand {
-protected:
-    NfsListCommand(const char* description, const ColumnTable& columns, VolumeQuery query, const char* peOnly)
-        : StorageCommand({
-              .description = description,
-              .result = ListOf(columns),
-              .formatter = "table",
-              .parameters = {{kPeOnly, "p", ParameterType::Flag, peOnly}},
-          }),
-          query_(query)
-    {
+// One row of either list, in the order the host is asked; the row's shape says which
+// version's fields it has.
+void FillRow(NetworkFileSystem& volume, const RowShape& shape, Row& row)
+{
+    const bool v41 = shape.Has(kHosts);
+    row.Set(kVolumeName, volume.GetVolumeName());
+    if (v41) {
+        row.Set(kHosts, JoinWithCommas(volume.GetRemoteHosts()));
+    } else {
+        row.Set(kHost, volume.GetRemoteHost());
     }
+    row.Set(kShare, volume.GetRemoteShare());
+    if (shape.Has(kKnxnic)) {
+        row.Set(kKnxnic, volume.GetKnxnic());
+    }
+    if (shape.Has(kKnxnics)) {
+        row.Set(kKnxnics, volume.GetKnxnics());
+    }
+    if (shape.Has(kConnections)) {
+        row.Set(kConnections, static_cast<long>(volume.GetConnections()));
+    }
+    row.Set(kAccessible, volume.IsAccessible());
+    row.Set(kMounted, volume.IsMounted());
+    row.Set(kReadOnly, v41 ? volume.GetReadOnlyState() : volume.IsReadOnly());
+    if (v41) {
+        row.Set(kSecurity, TranslateSecurity(volume.GetSecurityType()));
+    }
+    row.Set(kIsPE, volume.IsPE());
+    row.Set(kAcceleration, TranslateQAXI(volume.GetQAXIState()));
+}
 
-    virtual void FillRow(NetworkFileSystem& volume, const RowShape& shape, Row& row) = 0;
+const CommandDecl kV3Decl = {
+    .description = "List the NAS volumes currently known to the Zephal host.",
+    .result = ListOf(kV3Columns),
+    .formatter = "table",
+    .parameters = {{kPeOnly, "p", ParameterType::Flag, "Filter the output to only show TVol PE volumes"}}};
+
+const CommandDecl kV41Decl = {
+    .description = "List the NFS v4.1 volumes currently known to the Zephal host.",
+    .result = ListOf(kV41Columns),
+    .formatter = "table",
+    .parameters = {{kPeOnly, "p", ParameterType::Flag, "Filter the output to only show TVol PE Volumes"}}};
+
+// storage nfs list, storage nfs41 list: one row per volume of that version the filter lets
+// through; a volume that cannot be read is reported and left out.
+template <HostCtl::Storage::NfsVersion kVersion>
+class NfsVolumeList final : public StorageCommand {
+public:
+    using StorageCommand::StorageCommand;
 
 private:
     void Run(const InputPtr& in, const OutputPtr& out) override
@@ -106,7 +143,9 @@ private:
         auto rows = shape.EmptyList();
         const SkipReport report{"Error getting data for mount '", &HostCtl::Storage::FileSystem::GetVolumeName};
         WithStorageInfo(StorageInfoPlacement::InsideGuard, out, [&](StorageInfoImpl& storage) {
-            ReadEachOrSkip(query_(storage, filter), report, out, [&](NetworkFileSystem& volume) {
+            const auto volumes = kVersion == HostCtl::Storage::NFS_VERSION_41 ? storage.GetV41NetworkFileSystems(filter)
+                                                                              : storage.GetV3NetworkFileSystems(filter);
+            ReadEachOrSkip(volumes, report, out, [&](NetworkFileSystem& volume) {
                 auto row = shape.NewRow();
                 FillRow(volume, shape, row);
                 rows->Add(row.Structure());
@@ -114,77 +153,11 @@ private:
             out->SetRootObject(rows);
         });
     }
-
-    VolumeQuery query_;
-};
-
-// storage nfs list
-class NFSVolumeList final : public NfsListCommand {
-public:
-    NFSVolumeList()
-        : NfsListCommand("List the NAS volumes currently known to the Zephal host.", kV3Columns,
-                         [](StorageInfoImpl& storage, StorageInfoImpl::NetworkFileSystemFilter filter) {
-                             return storage.GetV3NetworkFileSystems(filter);
-                         },
-                          "Filter the output to only show TVol PE volumes")
-    {
-    }
-
-private:
-    void FillRow(NetworkFileSystem& volume, const RowShape& shape, Row& row) override
-    {
-        using namespace V3;
-        row.Set(kVolumeName, volume.GetVolumeName());
-        row.Set(kHost, volume.GetRemoteHost());
-        row.Set(kShare, volume.GetRemoteShare());
-        if (shape.Has(kKnxnic)) {
-            row.Set(kKnxnic, volume.GetKnxnic());
-        }
-        if (shape.Has(kConnections)) {
-            row.Set(kConnections, static_cast<long>(volume.GetConnections()));
-        }
-        row.Set(kAccessible, volume.IsAccessible());
-        row.Set(kMounted, volume.IsMounted());
-        row.Set(kReadOnly, volume.IsReadOnly());
-        row.Set(kIsPE, volume.IsPE());
-        row.Set(kAcceleration, TranslateQAXI(volume.GetQAXIState()));
-    }
-};
-
-// storage nfs41 list
-class NFS41VolumeList final : public NfsListCommand {
-public:
-    NFS41VolumeList()
-        : NfsListCommand("List the NFS v4.1 volumes currently known to the Zephal host.", kV41Columns,
-                         [](StorageInfoImpl& storage, StorageInfoImpl::NetworkFileSystemFilter filter) {
-                             return storage.GetV41NetworkFileSystems(filter);
-                         },
-                          "Filter the output to only show TVol PE Volumes")
-    {
-    }
-
-private:
-    void FillRow(NetworkFileSystem& volume, const RowShape& shape, Row& row) override
-    {
-        using namespace V41;
-        row.Set(kVolumeName, volume.GetVolumeName());
-        row.Set(kHosts, JoinWithCommas(volume.GetRemoteHosts()));
-        row.Set(kShare, volume.GetRemoteShare());
-        if (shape.Has(kKnxnics)) {
-            row.Set(kKnxnics, volume.GetKnxnics());
-        }
-        row.Set(kAccessible, volume.IsAccessible());
-        row.Set(kMounted, volume.IsMounted());
-        row.Set(kReadOnly, volume.GetReadOnlyState());
-        row.Set(kSecurity, TranslateSecurity(volume.GetSecurityType()));
-        row.Set(kIsPE, volume.IsPE());
-        row.Set(kAcceleration, TranslateQAXI(volume.GetQAXIState()));
-    }
 };
 
 } // namespace
 
-NodePtr NewNFSVolumeList() { return New<NFSVolumeList>(); }
-NodePtr NewNFS41VolumeList() { return New<NFS41VolumeList>(); }
+NodePtr NewNFSVolumeList() { return New<NfsVolumeList<HostCtl::Storage::NFS_VERSION_3>>(kV3Decl); }
+NodePtr NewNFS41VolumeList() { return New<NfsVolumeList<HostCtl::Storage::NFS_VERSION_41>>(kV41Decl); }
 
 } // namespace OrvaneCli::FileSystem

@@ -25,28 +25,34 @@ std::vector<std::unique_ptr<NetworkFileSystem>> NonPEV41Volumes(StorageInfoImpl&
 }
 
 // The first four fields are the same in both versions; each adds its own after them.
-enum Field { kVolumeNameField, kMaxQueueDepthField, kMaxReadField, kMaxWriteField, kKnxnicField, kConnectionsField };
-constexpr int kKnxnicsField = kKnxnicField;
+enum Field {
+    kVolumeNameField,
+    kMaxQueueDepthField,
+    kMaxReadField,
+    kMaxWriteField,
+    kKnxnicField,
+    kKnxnicsField,
+    kConnectionsField
+};
 
 const ColumnTable kV3Columns(
-    "NasMountParams",
-    {
-        {kVolumeNameField, "Volume Name", ColumnType::String},
-        {kMaxQueueDepthField, "MaxQueueDepth", ColumnType::Int},
-        {kMaxReadField, "MaxReadTransferSize", ColumnType::Int},
-        {kMaxWriteField, "MaxWriteTransferSize", ColumnType::Int},
-        {kKnxnicField, "Knxnic", ColumnType::String, {.feature = Feature::NfsKnxnicBinding}},
-        {kConnectionsField, "Connections", ColumnType::Int, {.feature = Feature::NfsConnections}},
-    });
+    "NasMountParams", {
+                          {kVolumeNameField, "Volume Name", ColumnType::String},
+                          {kMaxQueueDepthField, "MaxQueueDepth", ColumnType::Int},
+                          {kMaxReadField, "MaxReadTransferSize", ColumnType::Int},
+                          {kMaxWriteField, "MaxWriteTransferSize", ColumnType::Int},
+                          {kKnxnicField, "Knxnic", ColumnType::String, {.feature = Feature::NfsKnxnicBinding}},
+                          {kConnectionsField, "Connections", ColumnType::Int, {.feature = Feature::NfsConnections}},
+                      });
 
-const ColumnTable kV41Columns("NasMountParams",
-                              {
-                                  {kVolumeNameField, "Volume Name", ColumnType::String},
-                                  {kMaxQueueDepthField, "MaxQueueDepth", ColumnType::Int},
-                                  {kMaxReadField, "MaxReadTransferSize", ColumnType::Int},
-                                  {kMaxWriteField, "MaxWriteTransferSize", ColumnType::Int},
-                                  {kKnxnicsField, "Knxnics", ColumnType::String, {.feature = Feature::Nfs41KnxnicBinding}},
-                              });
+const ColumnTable kV41Columns(
+    "NasMountParams", {
+                          {kVolumeNameField, "Volume Name", ColumnType::String},
+                          {kMaxQueueDepthField, "MaxQueueDepth", ColumnType::Int},
+                          {kMaxReadField, "MaxReadTransferSize", ColumnType::Int},
+                          {kMaxWriteField, "MaxWriteTransferSize", ColumnType::Int},
+                          {kKnxnicsField, "Knxnics", ColumnType::String, {.feature = Feature::Nfs41KnxnicBinding}},
+                      });
 
 // Rows of the non-PE volumes named `name` (only the first that could be read), or of every
 // one for "all". `fillExtras` sets the fields after the sizes. A volume's name is read outside
@@ -124,95 +130,60 @@ ParameterDecl MaxQueueDepthParameter(const char* description)
     return {kMaxQueueDepth, "q", ParameterType::Int, description, false, IntRange(1, 4294967295L)};
 }
 
-// The parameter listing of one NFS version.
-class ParamGetCommand : public StorageCommand {
-protected:
-    ParamGetCommand(const char* description, const ColumnTable& columns, const char* volumeName, VolumeQuery query)
-        : StorageCommand({
-              .description = description,
-              .result = ListOf(columns),
-              .formatter = "table",
-              .parameters = {{kOptionVolumeName, "v", ParameterType::String, volumeName, true}},
-          }),
-          query_(query)
-    {
-    }
-
-    // Sets the fields after the sizes.
-    virtual void FillExtras(NetworkFileSystem& volume, const RowShape& shape, Row& row) = 0;
+// storage nfs param get, storage nfs41 param get: the row's shape says which fields follow
+// the sizes.
+template <HostCtl::Storage::NfsVersion kVersion>
+class NfsParamGet final : public StorageCommand {
+public:
+    using StorageCommand::StorageCommand;
 
 private:
     void Run(const InputPtr& in, const OutputPtr& out) override
     {
         const RowShape shape = Rows();
-        ListVolumeParams(in->GetParameter(kOptionVolumeName), query_, shape, out,
-                         [&](NetworkFileSystem& volume, Row& row) { FillExtras(volume, shape, row); });
-    }
-
-    VolumeQuery query_;
-};
-
-// storage nfs param get
-class NFSVolumeParamGet final : public ParamGetCommand {
-public:
-    NFSVolumeParamGet()
-        : ParamGetCommand("Get the volume parameters of the NAS volumes.", kV3Columns,
-                          "NAS volume name(\"all\" to list all).", NonPEV3Volumes)
-    {
-    }
-
-private:
-    void FillExtras(NetworkFileSystem& volume, const RowShape& shape, Row& row) override
-    {
-        if (shape.Has(kKnxnicField)) {
-            row.Set(kKnxnicField, volume.GetKnxnics());
-        }
-        if (shape.Has(kConnectionsField)) {
-            row.Set(kConnectionsField, static_cast<long>(volume.GetConnectionsParam()));
-        }
+        const VolumeQuery query = kVersion == HostCtl::Storage::NFS_VERSION_41 ? NonPEV41Volumes : NonPEV3Volumes;
+        ListVolumeParams(in->GetParameter(kOptionVolumeName), query, shape, out,
+                         [&](NetworkFileSystem& volume, Row& row) {
+                             if (shape.Has(kKnxnicField)) {
+                                 row.Set(kKnxnicField, volume.GetKnxnics());
+                             }
+                             if (shape.Has(kKnxnicsField)) {
+                                 row.Set(kKnxnicsField, volume.GetKnxnics());
+                             }
+                             if (shape.Has(kConnectionsField)) {
+                                 row.Set(kConnectionsField, static_cast<long>(volume.GetConnectionsParam()));
+                             }
+                         });
     }
 };
 
-// storage nfs41 param get
-class NFS41VolumeParamGet final : public ParamGetCommand {
-public:
-    NFS41VolumeParamGet()
-        : ParamGetCommand("Get the volume parameters of the NFS v4.1 volumes.", kV41Columns,
-                          "NFS v4.1 volume name(\"all\" to list all).", NonPEV41Volumes)
-    {
-    }
+const CommandDecl kV3GetDecl = {
+    .description = "Get the volume parameters of the NAS volumes.",
+    .result = ListOf(kV3Columns),
+    .formatter = "table",
+    .parameters = {{kOptionVolumeName, "v", ParameterType::String, "NAS volume name(\"all\" to list all).", true}}};
 
-private:
-    void FillExtras(NetworkFileSystem& volume, const RowShape& shape, Row& row) override
-    {
-        if (shape.Has(kKnxnicsField)) {
-            row.Set(kKnxnicsField, volume.GetKnxnics());
-        }
-    }
-};
+const CommandDecl kV41GetDecl = {.description = "Get the volume parameters of the NFS v4.1 volumes.",
+                                 .result = ListOf(kV41Columns),
+                                 .formatter = "table",
+                                 .parameters = {{kOptionVolumeName, "v", ParameterType::String,
+                                                 "NFS v4.1 volume name(\"all\" to list all).", true}}};
+
+const CommandDecl kNFSVolumeParamSetDecl = {
+    .description = "Set the volume parameters of the NAS volumes.",
+    .parameters = {{kOptionVolumeName, "v", ParameterType::String, "The NAS volume name.", true},
+                   MaxQueueDepthParameter("The maximum queue depth for the NAS volume."),
+                   {kKnxnic, "I", ParameterType::String, "The new knxnic to be configured for the NAS volume.", false,
+                    nullptr, Feature::NfsKnxnicBinding},
+                   {kOptionConnections, "c", ParameterType::Int,
+                    "The number of RPC connections to be established for the NFS datastore. A higher number of "
+                    "connections yields better performance on datastores with higher IO load.",
+                    false, IntRange(1, 8), Feature::NfsConnections}}};
 
 // storage nfs param set
 class NFSVolumeParamSet final : public StorageCommand {
-public:
-    NFSVolumeParamSet()
-        : StorageCommand({
-              .description = "Set the volume parameters of the NAS volumes.",
-              .parameters =
-                  {
-                      {kOptionVolumeName, "v", ParameterType::String, "The NAS volume name.", true},
-                      MaxQueueDepthParameter("The maximum queue depth for the NAS volume."),
-                      {kKnxnic, "I", ParameterType::String, "The new knxnic to be configured for the NAS volume.",
-                       false, nullptr, Feature::NfsKnxnicBinding},
-                      {kOptionConnections, "c", ParameterType::Int,
-                       "The number of RPC connections to be established for the NFS datastore. A higher number of "
-                       "connections yields better performance on datastores with higher IO load.",
-                       false, IntRange(1, 8), Feature::NfsConnections},
-                  },
-          })
-    {
-    }
+    using StorageCommand::StorageCommand;
 
-private:
     void Run(const InputPtr& in, const OutputPtr& out) override
     {
         const bool knxnicBinding = IsFeatureEnabled(Feature::NfsKnxnicBinding);
@@ -220,40 +191,32 @@ private:
         const std::string& knxnic = in->GetParameter(kKnxnic);
         const bool setKnxnic = knxnicBinding && IsGiven(knxnic);
         const bool setConnections = connections && in->HasParameter(kOptionConnections);
-        SetVolumeParams(in->GetParameter(kOptionVolumeName), NonPEV3Volumes, "NAS", out,
-                        [&](NetworkFileSystem& volume) {
-                            ApplyMaxQueueDepth(in, volume);
-                            if (setKnxnic) {
-                                volume.SetKnxnics(knxnic);
-                            }
-                            if (setConnections) {
-                                volume.SetConnectionsParam(
-                                    static_cast<std::int32_t>(in->GetParameterInt(kOptionConnections)));
-                            }
-                        });
+        SetVolumeParams(
+            in->GetParameter(kOptionVolumeName), NonPEV3Volumes, "NAS", out, [&](NetworkFileSystem& volume) {
+                ApplyMaxQueueDepth(in, volume);
+                if (setKnxnic) {
+                    volume.SetKnxnics(knxnic);
+                }
+                if (setConnections) {
+                    volume.SetConnectionsParam(static_cast<std::int32_t>(in->GetParameterInt(kOptionConnections)));
+                }
+            });
     }
 };
 
+const CommandDecl kNFS41VolumeParamSetDecl = {
+    .description = "Set the volume parameters of the NFS v4.1 volumes.",
+    .parameters = {{kOptionVolumeName, "v", ParameterType::String, "The NFS v4.1 volume name.", true},
+                   MaxQueueDepthParameter("The maximum queue depth for the NFS v4.1 volume."),
+                   {kOptionHostKnxnic, "I", ParameterType::StringList,
+                    "The hostname or IP address followed by a colon(:) and knxnic name. This parameter can be "
+                    "specified more than once. E.g.: --host-knxnic=host1:knxnic1 --host-knxnic=ip2:knxnic2",
+                    false, nullptr, Feature::Nfs41KnxnicBinding}}};
+
 // storage nfs41 param set
 class NFS41VolumeParamSet final : public StorageCommand {
-public:
-    NFS41VolumeParamSet()
-        : StorageCommand({
-              .description = "Set the volume parameters of the NFS v4.1 volumes.",
-              .parameters =
-                  {
-                      {kOptionVolumeName, "v", ParameterType::String, "The NFS v4.1 volume name.", true},
-                      MaxQueueDepthParameter("The maximum queue depth for the NFS v4.1 volume."),
-                      {kOptionHostKnxnic, "I", ParameterType::StringList,
-                       "The hostname or IP address followed by a colon(:) and knxnic name. This parameter can be "
-                       "specified more than once. E.g.: --host-knxnic=host1:knxnic1 --host-knxnic=ip2:knxnic2",
-                       false, nullptr, Feature::Nfs41KnxnicBinding},
-                  },
-          })
-    {
-    }
+    using StorageCommand::StorageCommand;
 
-private:
     void Run(const InputPtr& in, const OutputPtr& out) override
     {
         std::vector<std::string> hostKnxnics;
@@ -273,9 +236,9 @@ private:
 
 } // namespace
 
-NodePtr NewNFSVolumeParamGet() { return New<NFSVolumeParamGet>(); }
-NodePtr NewNFSVolumeParamSet() { return New<NFSVolumeParamSet>(); }
-NodePtr NewNFS41VolumeParamGet() { return New<NFS41VolumeParamGet>(); }
-NodePtr NewNFS41VolumeParamSet() { return New<NFS41VolumeParamSet>(); }
+NodePtr NewNFSVolumeParamGet() { return New<NfsParamGet<HostCtl::Storage::NFS_VERSION_3>>(kV3GetDecl); }
+NodePtr NewNFSVolumeParamSet() { return New<NFSVolumeParamSet>(kNFSVolumeParamSetDecl); }
+NodePtr NewNFS41VolumeParamGet() { return New<NfsParamGet<HostCtl::Storage::NFS_VERSION_41>>(kV41GetDecl); }
+NodePtr NewNFS41VolumeParamSet() { return New<NFS41VolumeParamSet>(kNFS41VolumeParamSetDecl); }
 
 } // namespace OrvaneCli::FileSystem

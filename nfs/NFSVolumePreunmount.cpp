@@ -7,70 +7,57 @@ namespace OrvaneCli::FileSystem {
 
 namespace {
 
-using PreunmountOperation = void (*)(StorageInfoImpl& storage, const std::string& volumeName);
+enum class Transition { Enter, Exit };
 
-// Runs one preunmount operation on the named volume. Unlike other commands, the host's
-// message never stands alone: it is prefixed with the command's failure text and the name.
-class PreunmountCommand : public StorageCommand {
-protected:
-    PreunmountCommand(const char* description, const char* volumeName, PreunmountOperation operation,
-                      const char* failurePrefix)
-        : StorageCommand({.description = description,
-                          .parameters = {{kOptionVolumeName, "v", ParameterType::String, volumeName, true}}}),
-          operation_(operation),
-          failurePrefix_(failurePrefix)
-    {
-    }
+// storage nfs preunmountstate enter / exit: moves the named volume into or out of the
+// preunmount state. Unlike other commands, the host's message never stands alone: it is
+// prefixed with what failed and the volume's name.
+template <Transition kTransition>
+class NfsPreunmountState final : public StorageCommand {
+public:
+    using StorageCommand::StorageCommand;
 
 private:
     void Run(const InputPtr& in, const OutputPtr& out) override
     {
+        constexpr bool kEnter = kTransition == Transition::Enter;
         // A failure to reach the storage information is not this command's to report.
         WithStorageInfo(StorageInfoPlacement::Unguarded, out, [&](StorageInfoImpl& storage) {
             const std::string& volumeName = in->GetParameter(kOptionVolumeName);
             try {
-                operation_(storage, volumeName);
+                if (kEnter) {
+                    storage.EnterNetworkFileSystemPreUnmount(volumeName);
+                } else {
+                    storage.ExitNetworkFileSystemPreUnmount(volumeName);
+                }
                 out->SetRootObject(MetaBool::New(true));
             } catch (const HostCtlException& e) {
-                out->AddErrorMessage(HostCtl::Misc::StrCat(failurePrefix_, volumeName, ": ", e.message));
+                out->AddErrorMessage(
+                    HostCtl::Misc::StrCat(kEnter ? "Preunmount Enter failed for " : "Preunmount Exit failed for ",
+                                          volumeName, ": ", e.message));
             }
         });
     }
-
-    PreunmountOperation operation_;
-    const char* failurePrefix_;
 };
 
-// storage nfs preunmountstate enter
-class NFSVolumePreunmountEnter final : public PreunmountCommand {
-public:
-    NFSVolumePreunmountEnter()
-        : PreunmountCommand("Enter NAS volume to preunmount state.", "Name of the NAS volume to enter preunmount state.",
-                            [](StorageInfoImpl& storage, const std::string& name) {
-                                storage.EnterNetworkFileSystemPreUnmount(name);
-                            },
-                             "Preunmount Enter failed for ")
-    {
-    }
-};
-
-// storage nfs preunmountstate exit
-class NFSVolumePreunmountExit final : public PreunmountCommand {
-public:
-    NFSVolumePreunmountExit()
-        : PreunmountCommand("Exit NAS volume from preunmount state.",
-                            "Name of the NAS volume to exit from preunmount state.",
-                            [](StorageInfoImpl& storage, const std::string& name) {
-                                storage.ExitNetworkFileSystemPreUnmount(name);
-                            },
-                             "Preunmount Exit failed for ")
-    {
-    }
-};
+CommandDecl PreunmountDecl(const char* description, const char* volumeName)
+{
+    return {.description = description,
+            .parameters = {{kOptionVolumeName, "v", ParameterType::String, volumeName, true}}};
+}
 
 } // namespace
 
-NodePtr NewNFSVolumePreunmountEnter() { return New<NFSVolumePreunmountEnter>(); }
-NodePtr NewNFSVolumePreunmountExit() { return New<NFSVolumePreunmountExit>(); }
+NodePtr NewNFSVolumePreunmountEnter()
+{
+    return New<NfsPreunmountState<Transition::Enter>>(
+        PreunmountDecl("Enter NAS volume to preunmount state.", "Name of the NAS volume to enter preunmount state."));
+}
+
+NodePtr NewNFSVolumePreunmountExit()
+{
+    return New<NfsPreunmountState<Transition::Exit>>(PreunmountDecl(
+        "Exit NAS volume from preunmount state.", "Name of the NAS volume to exit from preunmount state."));
+}
 
 } // namespace OrvaneCli::FileSystem

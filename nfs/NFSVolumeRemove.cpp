@@ -7,16 +7,15 @@ namespace OrvaneCli::FileSystem {
 
 namespace {
 
-// Removes the volume of one NFS version, telling the datastore notification script before,
-// and again when the removal failed (after the failure's message).
-class NfsRemoveCommand : public StorageCommand {
-protected:
-    NfsRemoveCommand(const char* description, const char* volumeName, HostCtl::Storage::NfsVersion version)
-        : StorageCommand({.description = description,
-                          .parameters = {{kOptionVolumeName, "v", ParameterType::String, volumeName, true}}}),
-          version_(version)
-    {
-    }
+using HostCtl::Storage::NfsVersion;
+
+// storage nfs remove, storage nfs41 remove: removes the volume of that version, telling the
+// datastore notification script before, and again when the removal failed (after the
+// failure's message).
+template <NfsVersion kVersion>
+class NfsVolumeRemove final : public StorageCommand {
+public:
+    using StorageCommand::StorageCommand;
 
 private:
     void Run(const InputPtr& in, const OutputPtr& out) override
@@ -25,42 +24,35 @@ private:
         const bool removed = WithStorageInfo(StorageInfoPlacement::OutsideGuard, out, [&](StorageInfoImpl&) {
             NotifyDatastore(kNotifyPreUnmount, volumeName);
             // The version-checked removal is a class operation; it needs no storage object.
-            StorageInfoImpl::RemoveNetworkFileSystem(volumeName, version_);
+            StorageInfoImpl::RemoveNetworkFileSystem(volumeName, kVersion);
             out->SetRootObject(MetaBool::New(true));
         });
         if (!removed) {
             NotifyDatastore(kNotifyFailedUnmount, volumeName);
         }
     }
-
-    HostCtl::Storage::NfsVersion version_;
 };
 
-// storage nfs remove
-class NFSVolumeRemove final : public NfsRemoveCommand {
-public:
-    NFSVolumeRemove()
-        : NfsRemoveCommand("Remove an existing NAS volume from the Zephal host.",
-                           "The volume name of the NAS volume to remove from the Zephal host.",
-                           HostCtl::Storage::NFS_VERSION_3)
-    {
-    }
-};
-
-// storage nfs41 remove
-class NFS41VolumeRemove final : public NfsRemoveCommand {
-public:
-    NFS41VolumeRemove()
-        : NfsRemoveCommand("Remove an existing NFS v4.1 volume from the Zephal host.",
-                           "The volume name of the NFS v4.1 volume to remove from the Zephal host.",
-                           HostCtl::Storage::NFS_VERSION_41)
-    {
-    }
-};
+CommandDecl RemoveDecl(const char* description, const char* volumeName)
+{
+    return {.description = description,
+            .parameters = {{kOptionVolumeName, "v", ParameterType::String, volumeName, true}}};
+}
 
 } // namespace
 
-NodePtr NewNFSVolumeRemove() { return New<NFSVolumeRemove>(); }
-NodePtr NewNFS41VolumeRemove() { return New<NFS41VolumeRemove>(); }
+NodePtr NewNFSVolumeRemove()
+{
+    return New<NfsVolumeRemove<HostCtl::Storage::NFS_VERSION_3>>(
+        RemoveDecl("Remove an existing NAS volume from the Zephal host.",
+                   "The volume name of the NAS volume to remove from the Zephal host."));
+}
+
+NodePtr NewNFS41VolumeRemove()
+{
+    return New<NfsVolumeRemove<HostCtl::Storage::NFS_VERSION_41>>(
+        RemoveDecl("Remove an existing NFS v4.1 volume from the Zephal host.",
+                   "The volume name of the NFS v4.1 volume to remove from the Zephal host."));
+}
 
 } // namespace OrvaneCli::FileSystem

@@ -48,65 +48,39 @@ bool IsIpMask(const std::string& text)
     return type == 1 || type == 3;
 }
 
-// add and remove: one IP/Mask entry handed to the host for the rule set of `version`.
-class IpMaskCommand : public StorageCommand {
-protected:
-    using Change = void (*)(StorageInfoImpl& storage, const std::string& ipMask, NfsVersion version);
+enum class Change { Add, Remove };
 
-    // `masksOnly`: refuse an entry without a mask before the host is asked.
-    IpMaskCommand(const char* description, const char* ipMask, NfsVersion version, Change change, bool masksOnly)
-        : StorageCommand({.description = description, .parameters = {{kIpMask, "F", ParameterType::String, ipMask, true}}}),
-          version_(version), change_(change), masksOnly_(masksOnly)
+// storage nfs firewall add / remove, storage nfs41 firewall add / remove: one IP/Mask entry
+// handed to the host. Only add checks the text first; remove passes any text on, the host
+// decides what it can remove.
+template <typename Ruleset, Change kChange>
+class NasFirewallChange final : public StorageCommand {
+public:
+    NasFirewallChange()
+        : StorageCommand({.description = kAdd ? Ruleset::addDescription : Ruleset::removeDescription,
+                          .parameters = {{kIpMask, "F", ParameterType::String,
+                                          kAdd ? Ruleset::addParameter : Ruleset::removeParameter, true}}})
     {
     }
 
 private:
+    static constexpr bool kAdd = kChange == Change::Add;
+
     void Run(const InputPtr& in, const OutputPtr& out) override
     {
         const std::string& ipMask = in->GetParameter(kIpMask);
-        if (masksOnly_ && !IsIpMask(ipMask)) {
+        if (kAdd && !IsIpMask(ipMask)) {
             out->AddErrorMessage("Only IP/Mask entries are allowed to be added");
             return;
         }
         WithStorageInfo(StorageInfoPlacement::InsideGuard, out, [&](StorageInfoImpl& storage) {
-            change_(storage, ipMask, version_);
+            if (kAdd) {
+                storage.AddNasFirewallConfig(ipMask, Ruleset::version);
+            } else {
+                storage.RemoveNasFirewallConfig(ipMask, Ruleset::version);
+            }
             out->SetRootObject(MetaBool::New(true));
         });
-    }
-
-    NfsVersion version_;
-    Change change_;
-    bool masksOnly_;
-};
-
-// storage nfs firewall add, storage nfs41 firewall add
-template <typename Ruleset>
-class NasFirewallAdd final : public IpMaskCommand {
-public:
-    NasFirewallAdd()
-        : IpMaskCommand(
-              Ruleset::addDescription, Ruleset::addParameter, Ruleset::version,
-              [](StorageInfoImpl& storage, const std::string& ipMask, NfsVersion version) {
-                  storage.AddNasFirewallConfig(ipMask, version);
-              },
-              true)
-    {
-    }
-};
-
-// storage nfs firewall remove, storage nfs41 firewall remove: any text is passed on, the
-// host decides what it can remove.
-template <typename Ruleset>
-class NasFirewallRemove final : public IpMaskCommand {
-public:
-    NasFirewallRemove()
-        : IpMaskCommand(
-              Ruleset::removeDescription, Ruleset::removeParameter, Ruleset::version,
-              [](StorageInfoImpl& storage, const std::string& ipMask, NfsVersion version) {
-                  storage.RemoveNasFirewallConfig(ipMask, version);
-              },
-              false)
-    {
     }
 };
 
@@ -133,11 +107,11 @@ private:
 
 } // namespace
 
-NodePtr NewNFSFirewallAdd() { return New<NasFirewallAdd<NfsClientRuleset>>(); }
-NodePtr NewNFSFirewallRemove() { return New<NasFirewallRemove<NfsClientRuleset>>(); }
+NodePtr NewNFSFirewallAdd() { return New<NasFirewallChange<NfsClientRuleset, Change::Add>>(); }
+NodePtr NewNFSFirewallRemove() { return New<NasFirewallChange<NfsClientRuleset, Change::Remove>>(); }
 NodePtr NewNFSFirewallList() { return New<NasFirewallList<NfsClientRuleset>>(); }
-NodePtr NewNFS41FirewallAdd() { return New<NasFirewallAdd<Nfs41ClientRuleset>>(); }
-NodePtr NewNFS41FirewallRemove() { return New<NasFirewallRemove<Nfs41ClientRuleset>>(); }
+NodePtr NewNFS41FirewallAdd() { return New<NasFirewallChange<Nfs41ClientRuleset, Change::Add>>(); }
+NodePtr NewNFS41FirewallRemove() { return New<NasFirewallChange<Nfs41ClientRuleset, Change::Remove>>(); }
 NodePtr NewNFS41FirewallList() { return New<NasFirewallList<Nfs41ClientRuleset>>(); }
 
 } // namespace OrvaneCli::FileSystem

@@ -6,9 +6,9 @@
 #include "internal/Manifest.h"
 #include "nfs/Manifest.h"
 
+using Quillets::QuilletException;
 using Quillets::AutoCli::Namespace;
 using Quillets::AutoCli::NamespaceNode;
-using Quillets::QuilletException;
 using namespace OrvaneCli::FileSystem;
 
 namespace {
@@ -18,7 +18,7 @@ NamespacePtr FindNamespace(const NodePtr& parent, const char* name)
 {
     auto missing = [&] {
         return QuilletException(HostCtl::Misc::StrPrintf("Unable to find '%s' namespace in namespace '%s'", name,
-                                                          parent->GetName().c_str()));
+                                                         parent->GetName().c_str()));
     };
     if (!parent->HasNamespaceNode(name)) {
         throw missing();
@@ -34,10 +34,7 @@ NamespacePtr FindNamespace(const NodePtr& parent, const char* name)
 
 extern "C" {
 
-void AutoCli_RegisterNamespaces(std::shared_ptr<NamespaceNode> root)
-{
-    Core_RegisterInternalNamespaces(root);
-}
+void AutoCli_RegisterNamespaces(std::shared_ptr<NamespaceNode> root) { Core_RegisterInternalNamespaces(root); }
 
 void Core_RegisterInternalNamespaces(std::shared_ptr<NamespaceNode> root)
 {
@@ -54,10 +51,7 @@ void Core_RegisterInternalNamespaces(std::shared_ptr<NamespaceNode> root)
     ClusteredHdsk_RegisterInternalNamespace(internal);
 }
 
-void Nmp_RegisterInternalNamespaces(std::shared_ptr<NamespaceNode> parent)
-{
-    Attach(parent, "nmp", NmpNamespace());
-}
+void Nmp_RegisterInternalNamespaces(std::shared_ptr<NamespaceNode> parent) { Attach(parent, "nmp", NmpNamespace()); }
 
 void ClusteredHdsk_RegisterInternalNamespace(std::shared_ptr<NamespaceNode> parent)
 {

@@ -25,9 +25,9 @@ TEST(HlfsHostListTest, StatusByVolumeModeAndHostMode)
         const char* otherHost; // host mode 0
     };
     const std::vector<Case> cases = {
-        {0x60, kDown, kUp},      {0x70, kDown, kUp},      {0x20, kNormal, kUp}, {0x30, kNormal, kUp},
-        {0x50, kDown, kInvalid}, {0x40, kDown, kNormal},  {0x10, kNormal, kInvalid},
-        {0x00, kInvalid, kNormal}, {0x0F, kInvalid, kNormal}, {0x90, kNormal, kInvalid},
+        {0x60, kDown, kUp},        {0x70, kDown, kUp},        {0x20, kNormal, kUp},      {0x30, kNormal, kUp},
+        {0x50, kDown, kInvalid},   {0x40, kDown, kNormal},    {0x10, kNormal, kInvalid}, {0x00, kInvalid, kNormal},
+        {0x0F, kInvalid, kNormal}, {0x90, kNormal, kInvalid},
     };
     for (const auto& c : cases) {
         SCOPED_TRACE(c.volumeMode);

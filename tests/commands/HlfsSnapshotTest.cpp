@@ -149,8 +149,11 @@ TEST(HlfsSnapshotTest, ReasonColumnsFollowTheirOwnCheck)
 json MixedExtentCopy(const std::string& name, const std::string& uuid)
 {
     json copy = Copy(name, uuid);
-    copy["extents"] = json::array({{{"deviceName", uuid + "-0"}}, {{"deviceName", "other"}, {"impl", false}},
-                                   {{"deviceName", uuid + "-2"}}, nullptr, {{"deviceName", uuid + "-4"}}});
+    copy["extents"] = json::array({{{"deviceName", uuid + "-0"}},
+                                   {{"deviceName", "other"}, {"impl", false}},
+                                   {{"deviceName", uuid + "-2"}},
+                                   nullptr,
+                                   {{"deviceName", uuid + "-4"}}});
     return copy;
 }
 
@@ -170,13 +173,23 @@ TEST(HlfsSnapshotTest, HostFailuresKeepTheRowsGatheredSoFar)
     const auto snapshotList = [] { return TestSupport::RegisteredCommand("storage hlfs snapshot list"); };
     const std::vector<Case> cases = {
         // One extent fails: the rest of that copy is skipped, the next copy is listed.
-        {"extent row", extentList, fault("DiskLunPartition.GetDeviceName", "u-b-2"), "",
+        {"extent row",
+         extentList,
+         fault("DiskLunPartition.GetDeviceName", "u-b-2"),
+         "",
          {"u-a-0", "u-a-2", "u-a-4", "u-b-0", "u-c-0", "u-c-2", "u-c-4"}},
-        {"volume in row", extentList, fault("UnresolvedHlfsVolumeImpl.GetLvmUuid", "u-b"), "",
+        {"volume in row",
+         extentList,
+         fault("UnresolvedHlfsVolumeImpl.GetLvmUuid", "u-b"),
+         "",
          {"u-a-0", "u-a-2", "u-a-4", "u-c-0", "u-c-2", "u-c-4"}},
         // A copy's extents cannot be listed: the walk ends.
         {"extents", extentList, fault("UnresolvedHlfsVolumeImpl.GetExtents", "u-b"), "", {"u-a-0", "u-a-2", "u-a-4"}},
-        {"selection", extentList, fault("UnresolvedHlfsVolumeImpl.GetVolumeName", "u-b"), "ds", {"u-a-0", "u-a-2", "u-a-4"}},
+        {"selection",
+         extentList,
+         fault("UnresolvedHlfsVolumeImpl.GetVolumeName", "u-b"),
+         "ds",
+         {"u-a-0", "u-a-2", "u-a-4"}},
         {"check", snapshotList, fault("UnresolvedHlfsVolumeImpl.CanResolve", "u-b"), "", {"u-a"}},
         {"count", snapshotList, fault("UnresolvedHlfsVolumeImpl.GetExtents", "u-c"), "", {"u-a", "u-b"}},
     };

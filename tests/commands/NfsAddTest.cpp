@@ -134,10 +134,12 @@ TEST(NfsAddTest, V41ServerListAndSecurityReachTheHostAsDecided)
 TEST(NfsAddTest, StorageInfoFailureIsAMessageOnlyForV41)
 {
     TestSupport::ScopedHost host(R"({"faults": [{"call": "StorageInfoImpl.new", "message": "no storage"}]})");
-    const auto v41 = TestSupport::Execute(*TestSupport::RegisteredCommand("storage nfs41 add"), MakeInput("hosts+=srv share=/exp volume-name=nas9"));
+    const auto v41 = TestSupport::Execute(*TestSupport::RegisteredCommand("storage nfs41 add"),
+                                          MakeInput("hosts+=srv share=/exp volume-name=nas9"));
     EXPECT_EQ(v41.errors, std::vector<std::string>{"no storage"});
     auto out = Output::New();
-    EXPECT_THROW(TestSupport::RegisteredCommand("storage nfs add")->Execute(MakeInput("host=srv share=/exp volume-name=nas9"), out),
+    EXPECT_THROW(TestSupport::RegisteredCommand("storage nfs add")
+                     ->Execute(MakeInput("host=srv share=/exp volume-name=nas9"), out),
                  HostCtlException);
 }
 

@@ -23,7 +23,8 @@ struct HostActionCommand {
 
 const std::vector<HostActionCommand> kCommands = {
     {"StorageInfoImpl.RescanHlfs", [] { return TestSupport::RegisteredCommand("storage filesystem rescan"); }},
-    {"StorageInfoImpl.AutoFullMountVolumes", [] { return TestSupport::RegisteredCommand("storage filesystem automount"); }},
+    {"StorageInfoImpl.AutoFullMountVolumes",
+     [] { return TestSupport::RegisteredCommand("storage filesystem automount"); }},
 };
 
 std::string FaultState(const std::string& call, const std::string& message)
