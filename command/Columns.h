@@ -27,7 +27,7 @@ struct ColumnOptions {
 struct Column {
     int field;
     const char* title;
-    ColumnType type;
+    ColumnType type = ColumnType::String;
     ColumnOptions options = {};
 };
 

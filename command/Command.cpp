@@ -24,7 +24,7 @@ std::shared_ptr<ParameterSpec> MakeParameter(const ParameterDecl& decl)
     if (decl.constraint) {
         parameter->SetConstraint(decl.constraint);
     }
-    parameter->SetRequired(decl.required);
+    parameter->SetRequired(decl.required || (decl.requiredUnless && !IsFeatureEnabled(*decl.requiredUnless)));
     return parameter;
 }
 

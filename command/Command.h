@@ -44,7 +44,12 @@ using Quillets::MetaObj::MetaType;
 using HostCtl::Lib::HostCtlException;
 using HostCtl::Storage::HlFileSystem;
 using HostCtl::Storage::NetworkFileSystem;
+using HostCtl::Storage::UnresolvedHlfsExtent;
+using HostCtl::Storage::UnresolvedHlfsVolume;
 using KnxCtl::Storage::StorageInfoImpl;
+using KnxCtl::Storage::StorageInfoScopedCache;
+using KnxCtl::Storage::UnresolvedHlfsExtentImpl;
+using KnxCtl::Storage::UnresolvedHlfsVolumeImpl;
 
 using InputPtr = std::shared_ptr<Input>;
 using OutputPtr = std::shared_ptr<Output>;
@@ -73,10 +78,11 @@ struct ParameterDecl {
     const char* name;
     const char* shortName;
     ParameterType type;
-    const char* description;
+    std::string description;
     bool required = false;
     std::shared_ptr<ParameterConstraint> constraint = nullptr;
-    std::optional<Feature> feature = std::nullopt; // declared only while this switch is on
+    std::optional<Feature> feature = std::nullopt;        // declared only while this switch is on
+    std::optional<Feature> requiredUnless = std::nullopt; // required while this switch is off
 };
 
 std::shared_ptr<ParameterSpec> MakeParameter(const ParameterDecl& decl);

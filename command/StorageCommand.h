@@ -28,7 +28,7 @@ inline ResultDecl ListOf(const ColumnTable& table) { return {ResultDecl::List, &
 inline ResultDecl One(const ColumnTable& table) { return {ResultDecl::Single, &table}; }
 
 struct CommandDecl {
-    const char* description;
+    std::string description;
     ResultDecl result = {};
     const char* formatter = nullptr; // the default formatter, if any
     std::vector<Example> examples = {};

@@ -11,10 +11,10 @@ using HostFileSystem = HostCtl::Storage::FileSystem;
 enum Field { kMountPoint, kVolumeName, kUuid, kType, kMounted, kSize, kFree };
 
 const ColumnTable kColumns("FilesystemVolume", {
-                                                   {kMountPoint, "Mount Point", ColumnType::String},
-                                                   {kVolumeName, "Volume Name", ColumnType::String},
-                                                   {kUuid, "UUID", ColumnType::String},
-                                                   {kType, "Type", ColumnType::String},
+                                                   {kMountPoint, "Mount Point"},
+                                                   {kVolumeName, "Volume Name"},
+                                                   {kUuid, "UUID"},
+                                                   {kType, "Type"},
                                                    {kMounted, "Mounted", ColumnType::Bool, {.shownAfter = kUuid}},
                                                    {kSize, "Size", ColumnType::Int},
                                                    {kFree, "Free", ColumnType::Int},

@@ -10,10 +10,10 @@ enum Field { kVolumeName, kHlfsUuid, kLvmUuid, kDeviceName, kPartition, kExtentN
 
 const ColumnTable kColumns("FilesystemHLFSExtents",
                            {
-                               {kVolumeName, "Volume Name", ColumnType::String},
-                               {kHlfsUuid, "HLFS UUID", ColumnType::String},
+                               {kVolumeName, "Volume Name"},
+                               {kHlfsUuid, "HLFS UUID"},
                                {kLvmUuid, "LVM UUID", ColumnType::String, {.shown = false}},
-                               {kDeviceName, "Device Name", ColumnType::String},
+                               {kDeviceName, "Device Name"},
                                {kPartition, "Partition", ColumnType::Int},
                                {kExtentNumber, "Extent Number", ColumnType::Int, {.shownAfter = kHlfsUuid}},
                            });

@@ -28,8 +28,8 @@ constexpr std::int64_t kMaxBandwidth = std::numeric_limits<std::int32_t>::max();
 const ColumnTable kColumns("HlfsReclaim",
                            {
                                {kGranularityField, "Reclaim Granularity", ColumnType::Int, {.unit = "Bytes"}},
-                               {kPriorityField, "Reclaim Priority", ColumnType::String},
-                               {kMethodField, "Reclaim Method", ColumnType::String},
+                               {kPriorityField, "Reclaim Priority"},
+                               {kMethodField, "Reclaim Method"},
                                {kBandwidthField, "Reclaim Bandwidth", ColumnType::Int, {.unit = "MB/s"}},
                            });
 

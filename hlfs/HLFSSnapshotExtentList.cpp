@@ -10,11 +10,11 @@ namespace {
 enum Field { kVolumeName, kHlfsUuid, kLvmUuid, kExtentNumber, kDeviceName, kPartition, kStart, kEnd };
 
 const ColumnTable kColumns("HLFSSnapshotExtent", {
-                                                     {kVolumeName, "Volume Name", ColumnType::String},
-                                                     {kHlfsUuid, "HLFS UUID", ColumnType::String},
+                                                     {kVolumeName, "Volume Name"},
+                                                     {kHlfsUuid, "HLFS UUID"},
                                                      {kLvmUuid, "LVM UUID", ColumnType::String, {.shown = false}},
                                                      {kExtentNumber, "Extent Number", ColumnType::Int},
-                                                     {kDeviceName, "Device Name", ColumnType::String},
+                                                     {kDeviceName, "Device Name"},
                                                      {kPartition, "Partition", ColumnType::Int},
                                                      {kStart, "Start", ColumnType::Int},
                                                      {kEnd, "End", ColumnType::Int},

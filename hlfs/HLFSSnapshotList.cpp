@@ -11,12 +11,12 @@ enum Field { kVolumeName, kHlfsUuid, kCanMount, kMountReason, kCanResignature, k
 
 const ColumnTable kColumns("HLFSSnapshot",
                            {
-                               {kVolumeName, "Volume Name", ColumnType::String},
-                               {kHlfsUuid, "HLFS UUID", ColumnType::String},
+                               {kVolumeName, "Volume Name"},
+                               {kHlfsUuid, "HLFS UUID"},
                                {kCanMount, "Can mount", ColumnType::Bool},
-                               {kMountReason, "Reason for un-mountability", ColumnType::String},
+                               {kMountReason, "Reason for un-mountability"},
                                {kCanResignature, "Can resignature", ColumnType::Bool},
-                               {kResignatureReason, "Reason for non-resignaturability", ColumnType::String},
+                               {kResignatureReason, "Reason for non-resignaturability"},
                                {kExtentCount, "Unresolved Extent Count", ColumnType::Int},
                            },
                            true, "%HLFS UUID%");

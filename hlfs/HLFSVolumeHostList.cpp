@@ -19,12 +19,12 @@ const char* const kLiveness = "liveness";
 enum Field { kHeartbeatUuid, kMacAddress, kDriverVersion, kHeartbeatOffset, kLockingMode, kStatus };
 
 const ColumnTable kColumns("VolumeLockModeInUse", {
-                                                      {kHeartbeatUuid, "Heartbeat UUID", ColumnType::String},
-                                                      {kMacAddress, "MAC Address", ColumnType::String},
-                                                      {kDriverVersion, "Driver Version", ColumnType::String},
+                                                      {kHeartbeatUuid, "Heartbeat UUID"},
+                                                      {kMacAddress, "MAC Address"},
+                                                      {kDriverVersion, "Driver Version"},
                                                       {kHeartbeatOffset, "Heartbeat Offset", ColumnType::Int},
-                                                      {kLockingMode, "Locking Mode", ColumnType::String},
-                                                      {kStatus, "Status", ColumnType::String},
+                                                      {kLockingMode, "Locking Mode"},
+                                                      {kStatus, "Status"},
                                                   });
 
 const CommandDecl kHLFSVolumeHostListDecl = {

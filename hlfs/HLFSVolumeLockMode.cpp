@@ -32,16 +32,15 @@ const char* const kScsi = "scsi";
 
 enum Field { kVolumeName, kUuid, kType, kLockingMode, kCompatible, kUpgradeModes, kIncompatibility };
 
-const ColumnTable kColumns("VolumeLockModeConfiguration",
-                           {
-                               {kVolumeName, "Volume Name", ColumnType::String},
-                               {kUuid, "UUID", ColumnType::String},
-                               {kType, "Type", ColumnType::String},
-                               {kLockingMode, "Locking Mode", ColumnType::String},
-                               {kCompatible, "ATS Compatible", ColumnType::Bool},
-                               {kUpgradeModes, "ATS Upgrade Modes", ColumnType::String},
-                               {kIncompatibility, "ATS Incompatibility Reason", ColumnType::String},
-                           });
+const ColumnTable kColumns("VolumeLockModeConfiguration", {
+                                                              {kVolumeName, "Volume Name"},
+                                                              {kUuid, "UUID"},
+                                                              {kType, "Type"},
+                                                              {kLockingMode, "Locking Mode"},
+                                                              {kCompatible, "ATS Compatible", ColumnType::Bool},
+                                                              {kUpgradeModes, "ATS Upgrade Modes"},
+                                                              {kIncompatibility, "ATS Incompatibility Reason"},
+                                                          });
 
 // A missing reason leaves the field at its empty value.
 void SetCompatibility(Row& row, bool compatible, const char* upgradeModes, const char* reason)

@@ -10,12 +10,6 @@
 
 namespace OrvaneCli::FileSystem {
 
-using HostCtl::Storage::UnresolvedHlfsExtent;
-using HostCtl::Storage::UnresolvedHlfsVolume;
-using KnxCtl::Storage::StorageInfoScopedCache;
-using KnxCtl::Storage::UnresolvedHlfsExtentImpl;
-using KnxCtl::Storage::UnresolvedHlfsVolumeImpl;
-
 // The text shown for a CanResolve reason code; unknown codes give "unknown error".
 const char* TranslateSnapshotReason(unsigned code);
 

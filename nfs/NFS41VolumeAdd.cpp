@@ -29,51 +29,43 @@ NetworkFileSystem::SecurityType ToSecurityType(const std::string& flavour)
 }
 
 const CommandDecl kNFS41VolumeAddDecl = {
-    "Add a new NFS v4.1 volume to the Zephal Host and mount it with the given volume name."};
+    .description = "Add a new NFS v4.1 volume to the Zephal Host and mount it with the given volume name.",
+    .parameters = {
+        {.name = kOptionHostKnxnic,
+         .shortName = "I",
+         .type = ParameterType::StringList,
+         .description = "The hostname or IP address followed by a colon(:) and knxnic name. This parameter can be "
+                        "specified more than once. E.g.: --host-knxnic=host1:knxnic1 --host-knxnic=ip2:knxnic2",
+         .feature = Feature::Nfs41KnxnicBinding},
+        {.name = kHosts,
+         .shortName = "H",
+         .type = ParameterType::StringList,
+         .description = "The hostname(s) or IP address(es) (comma-separated) of the server for the NFS v4.1 volume to "
+                        "add and mount on the system.",
+         .requiredUnless = Feature::Nfs41KnxnicBinding},
+        {NfsAddArg::kIsPE, "p", ParameterType::Flag, "If set, this flag will set the mount point to be PE."},
+        {NfsAddArg::kShare, "s", ParameterType::String,
+         "The share name on the remote system to use for this NFS v4.1 mount point.", true},
+        {kOptionVolumeName, "v", ParameterType::String,
+         "The volume name to use for the NFS v4.1 mount.  This must be a unique volume name and cannot conflict with "
+         "existing NAS, NFS v4.1, HLFS, or other volume names.",
+         true},
+        {NfsAddArg::kReadOnly, "r", ParameterType::Flag, "If set, this flag will make the mount point be read-only."},
+        {kSecurity, "a", ParameterType::String, "Security flavors. Acceptable values are: %ENUM%.", false,
+         StringEnum({{NetworkFileSystem::NFS_AUTH_SYS_STR.c_str(), "Authentication based on traditional UNIX ID"},
+                     {NetworkFileSystem::NFS_AUTH_KRB5_STR.c_str(),
+                      "Kerberos authentication with RPC header integrity protection"},
+                     {NetworkFileSystem::NFS_AUTH_KRB5I_STR.c_str(),
+                      "Kerberos authentication with data integrity protection"}})}}};
 
 // storage nfs41 add
 class NFS41VolumeAdd final : public StorageCommand {
     using StorageCommand::StorageCommand;
 
-    void DeclareParameters(const std::shared_ptr<InputSpec>& inputs) override;
     void Run(const InputPtr& in, const OutputPtr& out) override;
 };
 
 } // namespace
-
-void NFS41VolumeAdd::DeclareParameters(const std::shared_ptr<InputSpec>& inputs)
-{
-    const bool knxnicBinding = IsFeatureEnabled(Feature::Nfs41KnxnicBinding);
-    if (knxnicBinding) {
-        AddParameter(inputs, {kOptionHostKnxnic, "I", ParameterType::StringList,
-                              "The hostname or IP address followed by a colon(:) and knxnic name. This parameter can "
-                              "be specified more than once. E.g.: --host-knxnic=host1:knxnic1 "
-                              "--host-knxnic=ip2:knxnic2"});
-    }
-    AddParameter(inputs, {kHosts, "H", ParameterType::StringList,
-                          "The hostname(s) or IP address(es) (comma-separated) of the server for the NFS v4.1 volume "
-                          "to add and mount on the system.",
-                          !knxnicBinding});
-    AddParameter(inputs,
-                 {NfsAddArg::kIsPE, "p", ParameterType::Flag, "If set, this flag will set the mount point to be PE."});
-    AddParameter(inputs, {NfsAddArg::kShare, "s", ParameterType::String,
-                          "The share name on the remote system to use for this NFS v4.1 mount point.", true});
-    AddParameter(inputs, {kOptionVolumeName, "v", ParameterType::String,
-                          "The volume name to use for the NFS v4.1 mount.  This must be a unique volume name and "
-                          "cannot conflict with existing NAS, NFS v4.1, HLFS, or other volume names.",
-                          true});
-    AddParameter(inputs, {NfsAddArg::kReadOnly, "r", ParameterType::Flag,
-                          "If set, this flag will make the mount point be read-only."});
-    AddParameter(
-        inputs,
-        {kSecurity, "a", ParameterType::String, "Security flavors. Acceptable values are: %ENUM%.", false,
-         StringEnum({
-             {NetworkFileSystem::NFS_AUTH_SYS_STR.c_str(), "Authentication based on traditional UNIX ID"},
-             {NetworkFileSystem::NFS_AUTH_KRB5_STR.c_str(),
-              "Kerberos authentication with RPC header integrity protection"},
-             {NetworkFileSystem::NFS_AUTH_KRB5I_STR.c_str(), "Kerberos authentication with data integrity protection"},
-         })});
-}
 
 void NFS41VolumeAdd::Run(const InputPtr& in, const OutputPtr& out)
 {

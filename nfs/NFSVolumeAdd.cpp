@@ -46,49 +46,43 @@ std::optional<NfsServer> ReadServer(const InputPtr& in, const OutputPtr& out)
 }
 
 const CommandDecl kNFSVolumeAddDecl = {
-    "Add a new NAS volume to the Zephal Host and mount it with the given volume name."};
+    .description = "Add a new NAS volume to the Zephal Host and mount it with the given volume name.",
+    .parameters = {
+        {.name = kHost,
+         .shortName = "H",
+         .type = ParameterType::String,
+         .description = "The hostname or IP address of the NAS volume to add and mount on the system.",
+         .requiredUnless = Feature::NfsKnxnicBinding},
+        {.name = kOptionHostKnxnic,
+         .shortName = "I",
+         .type = ParameterType::String,
+         .description = "The hostname or IP address of the NAS volume to add, followed by a colon(:) and knxnic name "
+                        "i.e. <host/IP>:<knxnic> ",
+         .feature = Feature::NfsKnxnicBinding},
+        {NfsAddArg::kShare, "s", ParameterType::String,
+         "The share name on the remote system to use for this NAS mount point.", true},
+        {kOptionVolumeName, "v", ParameterType::String,
+         "The volume name to use for the NAS mount.  This must be a unique volume name and cannot conflict with "
+         "existing NAS, HLFS or other volume names.",
+         true},
+        {kOptionConnections, "c", ParameterType::Int,
+         "The number of RPC connections to be established for the NFS datastore. Minimum and default values are 1 "
+         "and maximum is 8. A higher number of connections yields better performance on datastores with higher IO "
+         "load.",
+         false, IntRange(1, 8), Feature::NfsConnections},
+        {NfsAddArg::kReadOnly, "r", ParameterType::Flag, "If set this flag will set the mount point to be read-only."},
+        {NfsAddArg::kIsPE, "p", ParameterType::Flag, "If set this flag will set the mount point to be PE."},
+        {kMountRetry, "", ParameterType::Flag, ""},
+        {kQueueDepth, "", ParameterType::Int, "", false, IntRange(1, 4294967295L)}}};
 
 // storage nfs add
 class NFSVolumeAdd final : public StorageCommand {
     using StorageCommand::StorageCommand;
 
-    void DeclareParameters(const std::shared_ptr<InputSpec>& inputs) override;
     void Run(const InputPtr& in, const OutputPtr& out) override;
 };
 
 } // namespace
-
-void NFSVolumeAdd::DeclareParameters(const std::shared_ptr<InputSpec>& inputs)
-{
-    const bool knxnicBinding = IsFeatureEnabled(Feature::NfsKnxnicBinding);
-    AddParameter(inputs,
-                 {kHost, "H", ParameterType::String,
-                  "The hostname or IP address of the NAS volume to add and mount on the system.", !knxnicBinding});
-    if (knxnicBinding) {
-        AddParameter(inputs, {kOptionHostKnxnic, "I", ParameterType::String,
-                              "The hostname or IP address of the NAS volume to add, followed by a colon(:) and knxnic "
-                              "name i.e. <host/IP>:<knxnic> "});
-    }
-    AddParameter(inputs, {NfsAddArg::kShare, "s", ParameterType::String,
-                          "The share name on the remote system to use for this NAS mount point.", true});
-    AddParameter(inputs, {kOptionVolumeName, "v", ParameterType::String,
-                          "The volume name to use for the NAS mount.  This must be a unique volume name and cannot "
-                          "conflict with existing NAS, HLFS or other volume names.",
-                          true});
-    if (IsFeatureEnabled(Feature::NfsConnections)) {
-        AddParameter(inputs, {kOptionConnections, "c", ParameterType::Int,
-                              "The number of RPC connections to be established for the NFS datastore. Minimum and "
-                              "default values are 1 and maximum is 8. A higher number of connections yields better "
-                              "performance on datastores with higher IO load.",
-                              false, IntRange(1, 8)});
-    }
-    AddParameter(inputs, {NfsAddArg::kReadOnly, "r", ParameterType::Flag,
-                          "If set this flag will set the mount point to be read-only."});
-    AddParameter(inputs,
-                 {NfsAddArg::kIsPE, "p", ParameterType::Flag, "If set this flag will set the mount point to be PE."});
-    AddParameter(inputs, {kMountRetry, "", ParameterType::Flag, ""});
-    AddParameter(inputs, {kQueueDepth, "", ParameterType::Int, "", false, IntRange(1, 4294967295L)});
-}
 
 void NFSVolumeAdd::Run(const InputPtr& in, const OutputPtr& out)
 {

@@ -58,30 +58,30 @@ enum Field {
 const ColumnTable kV3Columns(
     "NasMount",
     {
-        {kVolumeName, "Volume Name", ColumnType::String},
-        {kHost, "Host", ColumnType::String},
-        {kShare, "Share", ColumnType::String},
+        {kVolumeName, "Volume Name"},
+        {kHost, "Host"},
+        {kShare, "Share"},
         {kKnxnic, "Knxnic", ColumnType::String, {.feature = Feature::NfsKnxnicBinding}},
         {kConnections, "Connections", ColumnType::Int, {.feature = Feature::NfsConnections, .shownAfter = kMounted}},
         {kAccessible, "Accessible", ColumnType::Bool},
         {kMounted, "Mounted", ColumnType::Bool},
         {kReadOnly, "Read-Only", ColumnType::Bool},
         {kIsPE, "isPE", ColumnType::Bool},
-        {kAcceleration, "Hardware Acceleration", ColumnType::String},
+        {kAcceleration, "Hardware Acceleration"},
     });
 
 const ColumnTable kV41Columns("NasMount",
                               {
-                                  {kVolumeName, "Volume Name", ColumnType::String},
-                                  {kHosts, "Host(s)", ColumnType::String},
-                                  {kShare, "Share", ColumnType::String},
+                                  {kVolumeName, "Volume Name"},
+                                  {kHosts, "Host(s)"},
+                                  {kShare, "Share"},
                                   {kKnxnics, "Knxnics", ColumnType::String, {.feature = Feature::Nfs41KnxnicBinding}},
                                   {kAccessible, "Accessible", ColumnType::Bool},
                                   {kMounted, "Mounted", ColumnType::Bool},
                                   {kReadOnly, "Read-Only", ColumnType::Bool},
-                                  {kSecurity, "Security", ColumnType::String},
+                                  {kSecurity, "Security"},
                                   {kIsPE, "isPE", ColumnType::Bool},
-                                  {kAcceleration, "Hardware Acceleration", ColumnType::String},
+                                  {kAcceleration, "Hardware Acceleration"},
                               });
 
 // One row of either list, in the order the host is asked; the row's shape says which
@@ -131,10 +131,8 @@ const CommandDecl kV41Decl = {
 // through; a volume that cannot be read is reported and left out.
 template <HostCtl::Storage::NfsVersion kVersion>
 class NfsVolumeList final : public StorageCommand {
-public:
     using StorageCommand::StorageCommand;
 
-private:
     void Run(const InputPtr& in, const OutputPtr& out) override
     {
         const auto filter = in->IsFlagSet(kPeOnly) ? &StorageInfoImpl::IsPE : &StorageInfoImpl::IsNotHidden;

@@ -37,7 +37,7 @@ enum Field {
 
 const ColumnTable kV3Columns(
     "NasMountParams", {
-                          {kVolumeNameField, "Volume Name", ColumnType::String},
+                          {kVolumeNameField, "Volume Name"},
                           {kMaxQueueDepthField, "MaxQueueDepth", ColumnType::Int},
                           {kMaxReadField, "MaxReadTransferSize", ColumnType::Int},
                           {kMaxWriteField, "MaxWriteTransferSize", ColumnType::Int},
@@ -47,7 +47,7 @@ const ColumnTable kV3Columns(
 
 const ColumnTable kV41Columns(
     "NasMountParams", {
-                          {kVolumeNameField, "Volume Name", ColumnType::String},
+                          {kVolumeNameField, "Volume Name"},
                           {kMaxQueueDepthField, "MaxQueueDepth", ColumnType::Int},
                           {kMaxReadField, "MaxReadTransferSize", ColumnType::Int},
                           {kMaxWriteField, "MaxWriteTransferSize", ColumnType::Int},
@@ -134,10 +134,8 @@ ParameterDecl MaxQueueDepthParameter(const char* description)
 // the sizes.
 template <HostCtl::Storage::NfsVersion kVersion>
 class NfsParamGet final : public StorageCommand {
-public:
     using StorageCommand::StorageCommand;
 
-private:
     void Run(const InputPtr& in, const OutputPtr& out) override
     {
         const RowShape shape = Rows();

@@ -14,10 +14,8 @@ enum class Transition { Enter, Exit };
 // prefixed with what failed and the volume's name.
 template <Transition kTransition>
 class NfsPreunmountState final : public StorageCommand {
-public:
     using StorageCommand::StorageCommand;
 
-private:
     void Run(const InputPtr& in, const OutputPtr& out) override
     {
         constexpr bool kEnter = kTransition == Transition::Enter;

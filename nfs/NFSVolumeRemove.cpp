@@ -14,10 +14,8 @@ using HostCtl::Storage::NfsVersion;
 // failure's message).
 template <NfsVersion kVersion>
 class NfsVolumeRemove final : public StorageCommand {
-public:
     using StorageCommand::StorageCommand;
 
-private:
     void Run(const InputPtr& in, const OutputPtr& out) override
     {
         const std::string volumeName = in->GetParameter(kOptionVolumeName);

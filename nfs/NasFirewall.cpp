@@ -10,36 +10,17 @@ namespace {
 
 using HostCtl::Storage::NfsVersion;
 
-// The NFS client firewall rule sets differ only in their texts and the version they pass
-// to the host, so each command is written once over a rule set description.
-struct NfsClientRuleset {
-    static constexpr NfsVersion version = HostCtl::Storage::NFS_VERSION_3;
-    static constexpr const char* addDescription = "Add a new allowed IP/Mask entry in the nfsClient firewall ruleset";
-    static constexpr const char* addParameter = "The IP/Mask to be added in the nfsClient firewall ruleset";
-    static constexpr const char* removeDescription =
-        "Remove an existing IP/Mask entry from the nfsClient firewall ruleset";
-    static constexpr const char* removeParameter =
-        "IP/Mask entry that has to be removed from nfsClient firewall ruleset.";
-    static constexpr const char* listDescription =
-        "List the allowed IP/Mask entries from the nfsClient firewall ruleset.";
-};
-
-struct Nfs41ClientRuleset {
-    static constexpr NfsVersion version = HostCtl::Storage::NFS_VERSION_41;
-    static constexpr const char* addDescription = "Add a new allowed IP/Mask entry in the nfs41Client firewall ruleset";
-    static constexpr const char* addParameter = "The IP/Mask to be added in the nfs41Client firewall ruleset";
-    static constexpr const char* removeDescription =
-        "Remove an existing IP/Mask entry from the nfs41Client firewall ruleset";
-    static constexpr const char* removeParameter =
-        "IP/Mask entry that has to be removed from nfs41Client firewall ruleset.";
-    static constexpr const char* listDescription =
-        "List the allowed IP/Mask entries from the nfs41Client firewall ruleset.";
-};
+// The NFS client firewall rule sets differ only in their names and the version they pass to
+// the host, so each command is written once over the version.
+std::string Ruleset(NfsVersion version)
+{
+    return version == HostCtl::Storage::NFS_VERSION_41 ? "nfs41Client" : "nfsClient";
+}
 
 constexpr const char* kIpMask = "ip-mask";
 
 enum Field { kAllowedIpMask };
-const ColumnTable kColumns("NasFirewallConfigs", {{kAllowedIpMask, "Allowed IPMask", ColumnType::String}}, false);
+const ColumnTable kColumns("NasFirewallConfigs", {{kAllowedIpMask, "Allowed IPMask"}}, false);
 
 // Only entries with a mask may be added: IPv4 with /0-32 (1) or IPv6 with /0-128 (3).
 bool IsIpMask(const std::string& text)
@@ -53,13 +34,19 @@ enum class Change { Add, Remove };
 // storage nfs firewall add / remove, storage nfs41 firewall add / remove: one IP/Mask entry
 // handed to the host. Only add checks the text first; remove passes any text on, the host
 // decides what it can remove.
-template <typename Ruleset, Change kChange>
+template <NfsVersion kVersion, Change kChange>
 class NasFirewallChange final : public StorageCommand {
 public:
     NasFirewallChange()
-        : StorageCommand({.description = kAdd ? Ruleset::addDescription : Ruleset::removeDescription,
-                          .parameters = {{kIpMask, "F", ParameterType::String,
-                                          kAdd ? Ruleset::addParameter : Ruleset::removeParameter, true}}})
+        : StorageCommand(
+              {.description =
+                   kAdd ? "Add a new allowed IP/Mask entry in the " + Ruleset(kVersion) + " firewall ruleset"
+                        : "Remove an existing IP/Mask entry from the " + Ruleset(kVersion) + " firewall ruleset",
+               .parameters = {
+                   {kIpMask, "F", ParameterType::String,
+                    kAdd ? "The IP/Mask to be added in the " + Ruleset(kVersion) + " firewall ruleset"
+                         : "IP/Mask entry that has to be removed from " + Ruleset(kVersion) + " firewall ruleset.",
+                    true}}})
     {
     }
 
@@ -75,9 +62,9 @@ private:
         }
         WithStorageInfo(StorageInfoPlacement::InsideGuard, out, [&](StorageInfoImpl& storage) {
             if (kAdd) {
-                storage.AddNasFirewallConfig(ipMask, Ruleset::version);
+                storage.AddNasFirewallConfig(ipMask, kVersion);
             } else {
-                storage.RemoveNasFirewallConfig(ipMask, Ruleset::version);
+                storage.RemoveNasFirewallConfig(ipMask, kVersion);
             }
             out->SetRootObject(MetaBool::New(true));
         });
@@ -85,11 +72,14 @@ private:
 };
 
 // storage nfs firewall list, storage nfs41 firewall list
-template <typename Ruleset>
+template <NfsVersion kVersion>
 class NasFirewallList final : public StorageCommand {
 public:
     NasFirewallList()
-        : StorageCommand({.description = Ruleset::listDescription, .result = One(kColumns), .formatter = "simple"})
+        : StorageCommand(
+              {.description = "List the allowed IP/Mask entries from the " + Ruleset(kVersion) + " firewall ruleset.",
+               .result = One(kColumns),
+               .formatter = "simple"})
     {
     }
 
@@ -99,7 +89,7 @@ private:
         WithStorageInfo(StorageInfoPlacement::InsideGuard, out, [&](StorageInfoImpl& storage) {
             const RowShape shape = Rows();
             auto result = shape.NewRow();
-            result.Set(kAllowedIpMask, JoinWithCommas(storage.GetNasFirewallConfigs(Ruleset::version)));
+            result.Set(kAllowedIpMask, JoinWithCommas(storage.GetNasFirewallConfigs(kVersion)));
             out->SetRootObject(result.Structure());
         });
     }
@@ -107,11 +97,11 @@ private:
 
 } // namespace
 
-NodePtr NewNFSFirewallAdd() { return New<NasFirewallChange<NfsClientRuleset, Change::Add>>(); }
-NodePtr NewNFSFirewallRemove() { return New<NasFirewallChange<NfsClientRuleset, Change::Remove>>(); }
-NodePtr NewNFSFirewallList() { return New<NasFirewallList<NfsClientRuleset>>(); }
-NodePtr NewNFS41FirewallAdd() { return New<NasFirewallChange<Nfs41ClientRuleset, Change::Add>>(); }
-NodePtr NewNFS41FirewallRemove() { return New<NasFirewallChange<Nfs41ClientRuleset, Change::Remove>>(); }
-NodePtr NewNFS41FirewallList() { return New<NasFirewallList<Nfs41ClientRuleset>>(); }
+NodePtr NewNFSFirewallAdd() { return New<NasFirewallChange<HostCtl::Storage::NFS_VERSION_3, Change::Add>>(); }
+NodePtr NewNFSFirewallRemove() { return New<NasFirewallChange<HostCtl::Storage::NFS_VERSION_3, Change::Remove>>(); }
+NodePtr NewNFSFirewallList() { return New<NasFirewallList<HostCtl::Storage::NFS_VERSION_3>>(); }
+NodePtr NewNFS41FirewallAdd() { return New<NasFirewallChange<HostCtl::Storage::NFS_VERSION_41, Change::Add>>(); }
+NodePtr NewNFS41FirewallRemove() { return New<NasFirewallChange<HostCtl::Storage::NFS_VERSION_41, Change::Remove>>(); }
+NodePtr NewNFS41FirewallList() { return New<NasFirewallList<HostCtl::Storage::NFS_VERSION_41>>(); }
 
 } // namespace OrvaneCli::FileSystem
