@@ -13,20 +13,16 @@ StorageCommand::StorageCommand(CommandDecl decl) : decl_(std::move(decl))
     }
 }
 
-void StorageCommand::DeclareParameters(const std::shared_ptr<InputSpec>& inputs)
-{
-    for (const ParameterDecl& parameter : decl_.parameters) {
-        AddParameter(inputs, parameter);
-    }
-}
-
 std::shared_ptr<InputSpec> StorageCommand::GetInputSpecInternal()
 {
     for (const Example& example : decl_.examples) {
         AddExample(example.arguments, example.description);
     }
+    // Parameters tied to a feature switch are decided afresh at every call.
     auto inputs = InputSpec::New();
-    DeclareParameters(inputs);
+    for (const ParameterDecl& parameter : decl_.parameters) {
+        AddParameter(inputs, parameter);
+    }
     return inputs;
 }
 

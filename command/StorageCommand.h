@@ -1,10 +1,11 @@
 #pragma once
 
 // The base of every storage command: what a command declares about itself (description,
-// default formatter, examples, result) is given once to the constructor; the command adds
-// its parameters and runs.
+// default formatter, examples, parameters, result) is given once to the constructor; the
+// command itself only runs.
 
 #include <memory>
+#include <string>
 #include <utility>
 #include <vector>
 
@@ -42,9 +43,6 @@ public:
     explicit StorageCommand(CommandDecl decl);
 
 protected:
-    // Adds the command's parameters: those of its declaration, unless it decides them afresh
-    // (from the feature switches) at every call.
-    virtual void DeclareParameters(const std::shared_ptr<InputSpec>& inputs);
     virtual void Run(const InputPtr& in, const OutputPtr& out) = 0;
 
     // The shape of the result's rows as the switches are now.
