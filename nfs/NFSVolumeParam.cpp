@@ -186,8 +186,9 @@ class NFSVolumeParamSet final : public StorageCommand {
     {
         const bool knxnicBinding = IsFeatureEnabled(Feature::NfsKnxnicBinding);
         const bool connections = IsFeatureEnabled(Feature::NfsConnections);
-        const std::string& knxnic = in->GetParameter(kKnxnic);
-        const bool setKnxnic = knxnicBinding && IsGiven(knxnic);
+        // Only parameters the switches declared are read.
+        const std::string knxnic = knxnicBinding ? in->GetParameter(kKnxnic) : std::string();
+        const bool setKnxnic = IsGiven(knxnic);
         const bool setConnections = connections && in->HasParameter(kOptionConnections);
         SetVolumeParams(
             in->GetParameter(kOptionVolumeName), NonPEV3Volumes, "NAS", out, [&](NetworkFileSystem& volume) {
