@@ -2,6 +2,10 @@
 
 namespace OrvaneCli::FileSystem {
 
+namespace {
+const char* const kNotifyScript = "/usr/lib/orvane/tallowd/bin/notifyDatastore.py";
+} // namespace
+
 bool IsFeatureEnabled(Feature feature)
 {
     const unsigned char* flag = FeatureList[static_cast<int>(feature)];
@@ -20,13 +24,15 @@ std::shared_ptr<ParameterSpec> MakeParameter(const ParameterDecl& decl)
     if (decl.constraint) {
         parameter->SetConstraint(decl.constraint);
     }
-    parameter->SetRequired(decl.required);
+    parameter->SetRequired(decl.required || (decl.requiredUnless && !IsFeatureEnabled(*decl.requiredUnless)));
     return parameter;
 }
 
 void AddParameter(const std::shared_ptr<InputSpec>& inputs, const ParameterDecl& decl)
 {
-    inputs->AddParameter(MakeParameter(decl));
+    if (!decl.feature || IsFeatureEnabled(*decl.feature)) {
+        inputs->AddParameter(MakeParameter(decl));
+    }
 }
 
 std::shared_ptr<ParameterConstraint> IntRange(long min, long max)
@@ -61,6 +67,51 @@ std::shared_ptr<OutputSpec> ListOutputSpec(std::shared_ptr<MetaStruct> prototype
     auto outputs = OutputSpec::New();
     outputs->SetRootObject(MetaList::New(MetaType::Struct, std::move(prototype)));
     return outputs;
+}
+
+std::unique_ptr<HostCtl::Storage::StorageInfo> OpenHostStorageInfo()
+{
+    return HostCtl::HostFactory::GetHost()->GetStorageInfo();
+}
+
+std::string JoinWithCommas(const std::vector<std::string>& entries)
+{
+    std::string joined;
+    for (std::size_t i = 0; i < entries.size(); ++i) {
+        if (i > 0) {
+            joined += ',';
+        }
+        joined += entries[i];
+    }
+    return joined;
+}
+
+const char* GetHLFSVersionString(HlFileSystem* volume)
+{
+    if (volume->GetType() != HlFileSystem::HLFS_TYPE) {
+        return "Non-HLFS";
+    }
+    switch (volume->GetMajorVersion()) {
+    case 2:
+        return "HLFS-2";
+    case 3:
+        return "HLFS-3";
+    case 5:
+        return "HLFS-5";
+    case 6:
+        return "HLFS-6";
+    default:
+        return "HLFS-unknown version";
+    }
+}
+
+void NotifyDatastore(const std::string& event, const std::string& data)
+{
+    const std::string command = std::string(kNotifyScript) + " -t " + event + " -i " + "stdin";
+    std::string output;
+    const std::string input = data;
+    // The script's outcome does not change what the caller does next.
+    (void)Quillets::AutoCli::AutoCli_ShellCmd(command, output, input);
 }
 
 std::shared_ptr<OutputSpec> StructOutputSpec(std::shared_ptr<MetaStruct> structure)

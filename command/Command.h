@@ -6,6 +6,7 @@
 #include <cstdint>
 #include <initializer_list>
 #include <memory>
+#include <optional>
 #include <string>
 #include <utility>
 #include <vector>
@@ -24,6 +25,7 @@
 namespace OrvaneCli::FileSystem {
 
 using Quillets::AutoCli::Command;
+using Quillets::AutoCli::CommandSpec;
 using Quillets::CallSpec::Input;
 using Quillets::CallSpec::InputSpec;
 using Quillets::CallSpec::Output;
@@ -42,7 +44,12 @@ using Quillets::MetaObj::MetaType;
 using HostCtl::Lib::HostCtlException;
 using HostCtl::Storage::HlFileSystem;
 using HostCtl::Storage::NetworkFileSystem;
+using HostCtl::Storage::UnresolvedHlfsExtent;
+using HostCtl::Storage::UnresolvedHlfsVolume;
 using KnxCtl::Storage::StorageInfoImpl;
+using KnxCtl::Storage::StorageInfoScopedCache;
+using KnxCtl::Storage::UnresolvedHlfsExtentImpl;
+using KnxCtl::Storage::UnresolvedHlfsVolumeImpl;
 
 using InputPtr = std::shared_ptr<Input>;
 using OutputPtr = std::shared_ptr<Output>;
@@ -53,6 +60,8 @@ inline constexpr const char* kOptionVolumeUuid = "volume-uuid";
 inline constexpr const char* kOptionVolumeName = "volume-name";
 inline constexpr const char* kOptionNoPersist = "no-persist";
 inline constexpr const char* kOptionIgnoreErrors = "ignore-errors";
+inline constexpr const char* kOptionHostKnxnic = "host-knxnic";
+inline constexpr const char* kOptionConnections = "connections";
 
 // Host feature switches the plug-in reads; read afresh at every use, never cached.
 enum class Feature : int {
@@ -69,9 +78,11 @@ struct ParameterDecl {
     const char* name;
     const char* shortName;
     ParameterType type;
-    const char* description;
+    std::string description;
     bool required = false;
     std::shared_ptr<ParameterConstraint> constraint = nullptr;
+    std::optional<Feature> feature = std::nullopt;        // declared only while this switch is on
+    std::optional<Feature> requiredUnless = std::nullopt; // required while this switch is off
 };
 
 std::shared_ptr<ParameterSpec> MakeParameter(const ParameterDecl& decl);
@@ -106,6 +117,7 @@ bool Guarded(const OutputPtr& out, Body&& body)
 enum class StorageInfoPlacement {
     InsideGuard,  // a failure to create it becomes an error message
     OutsideGuard, // a failure to create it reaches the framework
+    Unguarded,    // neither it nor `body` is guarded: `body` guards what it must itself
 };
 
 // Creates the StorageInfoImpl where `placement` says and runs `body(storage)` in the
@@ -113,8 +125,12 @@ enum class StorageInfoPlacement {
 template <typename Body>
 bool WithStorageInfo(StorageInfoPlacement placement, const OutputPtr& out, Body&& body)
 {
-    if (placement == StorageInfoPlacement::OutsideGuard) {
+    if (placement != StorageInfoPlacement::InsideGuard) {
         StorageInfoImpl storage;
+        if (placement == StorageInfoPlacement::Unguarded) {
+            body(storage);
+            return true;
+        }
         return Guarded(out, [&] { body(storage); });
     }
     return Guarded(out, [&] {
@@ -125,5 +141,20 @@ bool WithStorageInfo(StorageInfoPlacement placement, const OutputPtr& out, Body&
 
 // A string parameter counts as given only when its value is not empty.
 inline bool IsGiven(const std::string& value) { return !value.empty(); }
+
+// The host's storage information as the host object hands it out (not the StorageInfoImpl).
+std::unique_ptr<HostCtl::Storage::StorageInfo> OpenHostStorageInfo();
+
+// The entries separated by "," (no blank); the empty text for none.
+std::string JoinWithCommas(const std::vector<std::string>& entries);
+
+// The type shown for a volume: "HLFS-<major version>", "HLFS-unknown version" or "Non-HLFS".
+const char* GetHLFSVersionString(HlFileSystem* volume);
+
+// Tells the host's datastore notification script about `event`, with `data` on its
+// standard input. The outcome of the script is ignored.
+void NotifyDatastore(const std::string& event, const std::string& data);
+inline constexpr const char* kNotifyPreUnmount = "PreUnmount";
+inline constexpr const char* kNotifyFailedUnmount = "FailedUnmount";
 
 } // namespace OrvaneCli::FileSystem

@@ -1,44 +1,23 @@
-#include "filesystem/VolumeRescan.h"
+#include "command/StorageCommand.h"
+#include "filesystem/Manifest.h"
 
 namespace OrvaneCli::FileSystem {
 
-std::shared_ptr<VolumeRescan> VolumeRescan::New() { return std::shared_ptr<VolumeRescan>(new VolumeRescan()); }
+namespace {
 
-VolumeRescan::VolumeRescan() { SetDescription("Scan storage devices for new mountable filesystems."); }
+// storage filesystem rescan
+class VolumeRescan final : public HostActionCommand {
+public:
+    VolumeRescan()
+        : HostActionCommand(
+              "Scan storage devices for new mountable filesystems.",
+              [](StorageInfoImpl& storage) { storage.RescanHlfs(); }, StorageInfoPlacement::OutsideGuard)
+    {
+    }
+};
 
-VolumeRescan::~VolumeRescan() = default;
+} // namespace
 
-std::shared_ptr<InputSpec> VolumeRescan::GetInputSpecInternal() { return InputSpec::New(); }
-
-std::shared_ptr<OutputSpec> VolumeRescan::GetOutputSpecInternal() { return BooleanOutputSpec(); }
-
-void VolumeRescan::ExecuteInternal(const InputPtr&, const OutputPtr& out)
-{
-    WithStorageInfo(StorageInfoPlacement::OutsideGuard, out, [&](StorageInfoImpl& storage) {
-        storage.RescanHlfs();
-        out->SetRootObject(MetaBool::New(true));
-    });
-}
-
-std::shared_ptr<VolumeAutomount> VolumeAutomount::New()
-{
-    return std::shared_ptr<VolumeAutomount>(new VolumeAutomount());
-}
-
-VolumeAutomount::VolumeAutomount() { SetDescription("Request mounting of known datastores not explicitly unmounted."); }
-
-VolumeAutomount::~VolumeAutomount() = default;
-
-std::shared_ptr<InputSpec> VolumeAutomount::GetInputSpecInternal() { return InputSpec::New(); }
-
-std::shared_ptr<OutputSpec> VolumeAutomount::GetOutputSpecInternal() { return BooleanOutputSpec(); }
-
-void VolumeAutomount::ExecuteInternal(const InputPtr&, const OutputPtr& out)
-{
-    WithStorageInfo(StorageInfoPlacement::OutsideGuard, out, [&](StorageInfoImpl& storage) {
-        storage.AutoFullMountVolumes();
-        out->SetRootObject(MetaBool::New(true));
-    });
-}
+NodePtr NewVolumeRescan() { return New<VolumeRescan>(); }
 
 } // namespace OrvaneCli::FileSystem

@@ -1,8 +1,8 @@
-#include "hlfs/HLFSReclaimConfig.h"
-
 #include <limits>
 
-#include "hlfs/HlfsVolumeSelection.h"
+#include "command/Selection.h"
+#include "command/StorageCommand.h"
+#include "hlfs/Manifest.h"
 
 namespace OrvaneCli::FileSystem {
 
@@ -10,11 +10,7 @@ using HostCtl::Storage::HlfsVolumeUnmapProperty;
 
 namespace {
 
-constexpr const char* kStructureName = "HlfsReclaim";
-constexpr const char* kGranularityField = "Reclaim Granularity";
-constexpr const char* kPriorityField = "Reclaim Priority";
-constexpr const char* kMethodField = "Reclaim Method";
-constexpr const char* kBandwidthField = "Reclaim Bandwidth";
+enum Field { kGranularityField, kPriorityField, kMethodField, kBandwidthField };
 
 constexpr const char* kGranularityParameter = "reclaim-granularity";
 constexpr const char* kPriorityParameter = "reclaim-priority";
@@ -29,93 +25,67 @@ constexpr std::int64_t kMaxGranularity = std::numeric_limits<std::uint32_t>::max
 constexpr std::int64_t kMinBandwidth = std::numeric_limits<std::int32_t>::min();
 constexpr std::int64_t kMaxBandwidth = std::numeric_limits<std::int32_t>::max();
 
-std::shared_ptr<MetaStruct> EmptyReclaimStructure()
-{
-    auto structure = MetaStruct::New(kStructureName);
-    structure->SetField(kGranularityField, MetaInt::New());
-    structure->SetField(kPriorityField, MetaString::New());
-    structure->SetField(kMethodField, MetaString::New());
-    structure->SetField(kBandwidthField, MetaInt::New());
-    return structure;
-}
+const ColumnTable kColumns("HlfsReclaim",
+                           {
+                               {kGranularityField, "Reclaim Granularity", ColumnType::Int, {.unit = "Bytes"}},
+                               {kPriorityField, "Reclaim Priority"},
+                               {kMethodField, "Reclaim Method"},
+                               {kBandwidthField, "Reclaim Bandwidth", ColumnType::Int, {.unit = "MB/s"}},
+                           });
+
+const CommandDecl kHLFSReclaimConfigGetDecl = {.description = "Get space reclamation configuration parameters",
+                                               .result = One(kColumns),
+                                               .formatter = "simple",
+                                               .parameters = {HlfsLabelParameter(), HlfsUuidParameter()}};
+
+// storage hlfs reclaim config get
+class HLFSReclaimConfigGet final : public StorageCommand {
+    using StorageCommand::StorageCommand;
+
+    void Run(const InputPtr& in, const OutputPtr& out) override;
+};
+
+const CommandDecl kHLFSReclaimConfigSetDecl = {
+    .description = "Set space reclamation configuration parameters",
+    .parameters = {
+        HlfsLabelParameter(),
+        HlfsUuidParameter(),
+        {kGranularityParameter, "g", ParameterType::Int, "Minimum granularity of automatic space reclamation in bytes"},
+        {kPriorityParameter, "p", ParameterType::String,
+         "Priority of automatic space reclamation. Supported options are %ENUM%.", false,
+         StringEnum({{"none", ""}, {"low", ""}, {"medium", ""}, {"high", ""}})},
+        {kMethodParameter, "m", ParameterType::String,
+         "Method of automatic space reclamation.  Supported options are %ENUM%.", false,
+         StringEnum({{kMethodPriority, ""}, {kMethodFixed, ""}})},
+        {kBandwidthParameter, "b", ParameterType::Int, "Space reclamation fixed bandwidth (MB/s)"}}};
+
+// storage hlfs reclaim config set
+class HLFSReclaimConfigSet final : public StorageCommand {
+    using StorageCommand::StorageCommand;
+
+    void Run(const InputPtr& in, const OutputPtr& out) override;
+};
 
 } // namespace
 
-std::shared_ptr<HLFSReclaimConfigGet> HLFSReclaimConfigGet::New()
+void HLFSReclaimConfigGet::Run(const InputPtr& in, const OutputPtr& out)
 {
-    return std::shared_ptr<HLFSReclaimConfigGet>(new HLFSReclaimConfigGet());
-}
-
-HLFSReclaimConfigGet::HLFSReclaimConfigGet()
-{
-    SetDescription("Get space reclamation configuration parameters");
-    SetDefaultOutputFormatter("simple");
-    SetDefaultOutputParameter("fields:HlfsReclaim",
-                              "Reclaim Granularity,Reclaim Priority,Reclaim Method,Reclaim Bandwidth");
-    SetDefaultOutputParameter("units:HlfsReclaim.Reclaim Bandwidth", "MB/s");
-    SetDefaultOutputParameter("units:HlfsReclaim.Reclaim Granularity", "Bytes");
-}
-
-HLFSReclaimConfigGet::~HLFSReclaimConfigGet() = default;
-
-std::shared_ptr<InputSpec> HLFSReclaimConfigGet::GetInputSpecInternal() { return GetSingleHLFSVolumeInputSpec(); }
-
-std::shared_ptr<OutputSpec> HLFSReclaimConfigGet::GetOutputSpecInternal()
-{
-    return StructOutputSpec(EmptyReclaimStructure());
-}
-
-void HLFSReclaimConfigGet::ExecuteInternal(const InputPtr& in, const OutputPtr& out)
-{
-    const std::unique_ptr<HlFileSystem> volume = GetSingleHLFSVolume(in, out);
-    if (!volume) {
-        return;
-    }
-    Guarded(out, [&] {
-        const HlfsVolumeUnmapProperty property = volume->GetUnmapProperty();
-        auto structure = EmptyReclaimStructure();
-        structure->SetField(kGranularityField, static_cast<long>(property.granularity));
-        structure->SetField(kPriorityField, property.priority);
-        structure->SetField(kMethodField, property.method);
-        structure->SetField(kBandwidthField, static_cast<int>(property.bandwidth));
-        out->SetRootObject(structure);
+    WithSingleHLFSVolume(in, out, [&](HlFileSystem& volume) {
+        const HlfsVolumeUnmapProperty property = volume.GetUnmapProperty();
+        const RowShape shape = Rows();
+        auto structure = shape.NewRow();
+        structure.Set(kGranularityField, static_cast<long>(property.granularity));
+        structure.Set(kPriorityField, property.priority);
+        structure.Set(kMethodField, property.method);
+        structure.Set(kBandwidthField, static_cast<int>(property.bandwidth));
+        out->SetRootObject(structure.Structure());
     });
 }
 
-std::shared_ptr<HLFSReclaimConfigSet> HLFSReclaimConfigSet::New()
-{
-    return std::shared_ptr<HLFSReclaimConfigSet>(new HLFSReclaimConfigSet());
-}
-
-HLFSReclaimConfigSet::HLFSReclaimConfigSet() { SetDescription("Set space reclamation configuration parameters"); }
-
-HLFSReclaimConfigSet::~HLFSReclaimConfigSet() = default;
-
-std::shared_ptr<InputSpec> HLFSReclaimConfigSet::GetInputSpecInternal()
-{
-    auto inputs = GetSingleHLFSVolumeInputSpec();
-    AddParameter(inputs, {kGranularityParameter, "g", ParameterType::Int,
-                        "Minimum granularity of automatic space reclamation in bytes"});
-    AddParameter(inputs, {kPriorityParameter, "p", ParameterType::String,
-                        "Priority of automatic space reclamation. Supported options are %ENUM%.", false,
-                        StringEnum({{"none", ""}, {"low", ""}, {"medium", ""}, {"high", ""}})});
-    AddParameter(inputs, {kMethodParameter, "m", ParameterType::String,
-                        "Method of automatic space reclamation.  Supported options are %ENUM%.", false,
-                        StringEnum({{kMethodPriority, ""}, {kMethodFixed, ""}})});
-    AddParameter(inputs, {kBandwidthParameter, "b", ParameterType::Int, "Space reclamation fixed bandwidth (MB/s)"});
-    return inputs;
-}
-
-std::shared_ptr<OutputSpec> HLFSReclaimConfigSet::GetOutputSpecInternal() { return BooleanOutputSpec(); }
-
-void HLFSReclaimConfigSet::ExecuteInternal(const InputPtr& in, const OutputPtr& out)
+void HLFSReclaimConfigSet::Run(const InputPtr& in, const OutputPtr& out)
 {
     // The volume comes first: a selection error hides any parameter error.
-    const std::unique_ptr<HlFileSystem> volume = GetSingleHLFSVolume(in, out);
-    if (!volume) {
-        return;
-    }
-    Guarded(out, [&] {
+    WithSingleHLFSVolume(in, out, [&](HlFileSystem& volume) {
         const bool granularityGiven = in->HasParameter(kGranularityParameter);
         const std::string priority = in->GetParameter(kPriorityParameter);
         const std::string method = in->GetParameter(kMethodParameter);
@@ -170,9 +140,12 @@ void HLFSReclaimConfigSet::ExecuteInternal(const InputPtr& in, const OutputPtr& 
             return;
         }
 
-        volume->SetUnmapProperty(property);
+        volume.SetUnmapProperty(property);
         out->SetRootObject(MetaBool::New(true));
     });
 }
+
+NodePtr NewHLFSReclaimConfigGet() { return New<HLFSReclaimConfigGet>(kHLFSReclaimConfigGetDecl); }
+NodePtr NewHLFSReclaimConfigSet() { return New<HLFSReclaimConfigSet>(kHLFSReclaimConfigSetDecl); }
 
 } // namespace OrvaneCli::FileSystem

@@ -1,9 +1,10 @@
-#include "hlfs/HLFSVolumeHostList.h"
-
-#include "hlfs/HLFSVolumeLockMode.h"
-#include "hlfs/HlfsVolumeSelection.h"
+#include "command/Selection.h"
+#include "command/StorageCommand.h"
+#include "hlfs/Manifest.h"
 
 namespace OrvaneCli::FileSystem {
+
+using HostCtl::Storage::HlfsUserInfo;
 
 namespace {
 
@@ -14,57 +15,67 @@ constexpr const char* kInvalid = "INVALID (needs unmount)";
 constexpr const char* kUpgradePending = "ATS Upgrade Pending";
 constexpr const char* kDowngradePending = "ATS Downgrade Pending";
 
+const char* const kLiveness = "liveness";
+enum Field { kHeartbeatUuid, kMacAddress, kDriverVersion, kHeartbeatOffset, kLockingMode, kStatus };
+
+const ColumnTable kColumns("VolumeLockModeInUse", {
+                                                      {kHeartbeatUuid, "Heartbeat UUID"},
+                                                      {kMacAddress, "MAC Address"},
+                                                      {kDriverVersion, "Driver Version"},
+                                                      {kHeartbeatOffset, "Heartbeat Offset", ColumnType::Int},
+                                                      {kLockingMode, "Locking Mode"},
+                                                      {kStatus, "Status"},
+                                                  });
+
+const CommandDecl kHLFSVolumeHostListDecl = {
+    .description = "List hosts accessing a particular HLFS Volume.",
+    .result = ListOf(kColumns),
+    .formatter = "table",
+    .examples = {{"-l datastore1", "List hosts using volume 'datastore1' with default liveness check of 'none'."},
+                 {"-l datastore1 -v quick", "List hosts using volume 'datastore1' with liveness check of 'quick'."}},
+    .parameters = {HlfsLabelParameter(),
+                   HlfsUuidParameter(),
+                   {kLiveness, "v", ParameterType::String,
+                    "The type of liveness check to perform on the HLFS volume. Valid values are %ENUM% (default is "
+                    "none).",
+                    false,
+                    StringEnum({{"none", "No liveness check, just scan heartbeats (default)"},
+                                {"quick", "Quick liveness check, wait for one heartbeat interval"}})}}};
+
+// storage hlfs host list
+class HLFSVolumeHostList final : public StorageCommand {
+    using StorageCommand::StorageCommand;
+
+    void Run(const InputPtr& in, const OutputPtr& out) override
+    {
+        const bool quick = in->GetParameter(kLiveness) == "quick";
+        WithSingleHLFSVolume(in, out, [&](HlFileSystem& volume) {
+            const RowShape shape = Rows();
+            auto list = shape.EmptyList();
+            for (const HlfsUserInfo& record : volume.GetUsers(quick)) {
+                auto row = shape.NewRow();
+                row.Set(kHeartbeatUuid, record.heartbeatUuid);
+                row.Set(kMacAddress, record.macAddress.GetStringAddress());
+                row.Set(kDriverVersion,
+                        std::to_string(record.driverVersionMajor) + "." + std::to_string(record.driverVersionMinor));
+                row.Set(kHeartbeatOffset, static_cast<long>(record.heartbeatOffset));
+                row.Set(kLockingMode, TranslateLockModeInUse(record.lockModeInUse));
+                row.Set(kStatus, TranslateStatus(volume.GetLockMode(), record.lockModeInUse));
+                list->Add(row.Structure());
+            }
+            out->SetRootObject(list);
+        });
+    }
+};
+
 } // namespace
 
-std::shared_ptr<HLFSVolumeHostList> HLFSVolumeHostList::New()
-{
-    return std::shared_ptr<HLFSVolumeHostList>(new HLFSVolumeHostList());
-}
-
-HLFSVolumeHostList::HLFSVolumeHostList()
-{
-    SetDescription("List hosts accessing a particular HLFS Volume.");
-    SetDefaultOutputFormatter("table");
-    SetDefaultOutputParameter("fields:VolumeLockModeInUse",
-                              "Heartbeat UUID,MAC Address,Driver Version,Heartbeat Offset,Locking Mode,Status");
-}
-
-HLFSVolumeHostList::~HLFSVolumeHostList() = default;
-
-std::shared_ptr<InputSpec> HLFSVolumeHostList::GetInputSpecInternal()
-{
-    AddExample("-l datastore1", "List hosts using volume 'datastore1' with default liveness check of 'none'.");
-    AddExample("-l datastore1 -v quick", "List hosts using volume 'datastore1' with liveness check of 'quick'.");
-    auto inputs = GetSingleHLFSVolumeInputSpec();
-    AddParameter(inputs, {"liveness", "v", ParameterType::String,
-                        "The type of liveness check to perform on the HLFS volume. Valid values are %ENUM% (default "
-                        "is none).",
-                        false,
-                        StringEnum({{"none", "No liveness check, just scan heartbeats (default)"},
-                                    {"quick", "Quick liveness check, wait for one heartbeat interval"}})});
-    return inputs;
-}
-
-std::shared_ptr<OutputSpec> HLFSVolumeHostList::GetOutputSpecInternal() { return ListOutputSpec(GetOutputStructure()); }
-
-std::shared_ptr<MetaStruct> HLFSVolumeHostList::GetOutputStructure()
-{
-    auto row = MetaStruct::New("VolumeLockModeInUse");
-    row->SetField("Heartbeat UUID", MetaString::New());
-    row->SetField("MAC Address", MetaString::New());
-    row->SetField("Driver Version", MetaString::New());
-    row->SetField("Heartbeat Offset", MetaInt::New());
-    row->SetField("Locking Mode", MetaString::New());
-    row->SetField("Status", MetaString::New());
-    return row;
-}
-
-const char* HLFSVolumeHostList::TranslateLockModeInUse(unsigned char hostMode)
+const char* TranslateLockModeInUse(unsigned char hostMode)
 {
     return hostMode == kHostAtsOnly ? "ATS-only" : "ATS+SCSI";
 }
 
-const char* HLFSVolumeHostList::TranslateStatus(unsigned int volumeMode, unsigned char hostMode)
+const char* TranslateStatus(unsigned int volumeMode, unsigned char hostMode)
 {
     // Here a host counts as ATS-only by the bit, not by equality as in its "Locking Mode".
     const bool hostAtsOnly = (hostMode & kHostAtsOnly) != 0;
@@ -88,40 +99,6 @@ const char* HLFSVolumeHostList::TranslateStatus(unsigned int volumeMode, unsigne
     return hostAtsOnly == atsOnly ? kNormal : kInvalid;
 }
 
-void HLFSVolumeHostList::PopulateHostListSpec(std::shared_ptr<MetaStruct> row, HlFileSystem* volume,
-                                              HlfsUserInfo* record)
-{
-    row->SetField("Heartbeat UUID", record->heartbeatUuid);
-    row->SetField("MAC Address", record->macAddress.GetStringAddress());
-    row->SetField("Driver Version",
-                  std::to_string(record->driverVersionMajor) + "." + std::to_string(record->driverVersionMinor));
-    row->SetField("Heartbeat Offset", static_cast<long>(record->heartbeatOffset));
-    row->SetField("Locking Mode", TranslateLockModeInUse(record->lockModeInUse));
-    row->SetField("Status", TranslateStatus(volume->GetLockMode(), record->lockModeInUse));
-}
-
-void HLFSVolumeHostList::UpdateList(HlFileSystem* volume, const std::vector<HlfsUserInfo>& records,
-                                    std::shared_ptr<MetaList> list)
-{
-    for (HlfsUserInfo record : records) {
-        auto row = GetOutputStructure();
-        PopulateHostListSpec(row, volume, &record);
-        list->Add(row);
-    }
-}
-
-void HLFSVolumeHostList::ExecuteInternal(const InputPtr& in, const OutputPtr& out)
-{
-    const bool quick = in->GetParameter("liveness") == "quick";
-    const std::unique_ptr<HlFileSystem> volume = GetSingleHLFSVolume(in, out);
-    if (!volume) {
-        return;
-    }
-    Guarded(out, [&] {
-        auto list = MetaList::New(MetaType::Struct, GetOutputStructure());
-        UpdateList(volume.get(), volume->GetUsers(quick), list);
-        out->SetRootObject(list);
-    });
-}
+NodePtr NewHLFSVolumeHostList() { return New<HLFSVolumeHostList>(kHLFSVolumeHostListDecl); }
 
 } // namespace OrvaneCli::FileSystem

@@ -1,8 +1,8 @@
-#include "hlfs/HLFSVolumeLockMode.h"
-
 #include <optional>
 
-#include "hlfs/HlfsVolumeSelection.h"
+#include "command/Selection.h"
+#include "command/StorageCommand.h"
+#include "hlfs/Manifest.h"
 
 namespace OrvaneCli::FileSystem {
 
@@ -27,67 +27,181 @@ std::optional<bool> ReadOnlineUpgradeEnabled(const OutputPtr& out)
     return integer->GetValue() != 0;
 }
 
-void SetCompatibility(const std::shared_ptr<MetaStruct>& row, bool compatible, const char* upgradeModes,
-                      const char* reason)
+const char* const kAts = "ats";
+const char* const kScsi = "scsi";
+
+enum Field { kVolumeName, kUuid, kType, kLockingMode, kCompatible, kUpgradeModes, kIncompatibility };
+
+const ColumnTable kColumns("VolumeLockModeConfiguration", {
+                                                              {kVolumeName, "Volume Name"},
+                                                              {kUuid, "UUID"},
+                                                              {kType, "Type"},
+                                                              {kLockingMode, "Locking Mode"},
+                                                              {kCompatible, "ATS Compatible", ColumnType::Bool},
+                                                              {kUpgradeModes, "ATS Upgrade Modes"},
+                                                              {kIncompatibility, "ATS Incompatibility Reason"},
+                                                          });
+
+// A missing reason leaves the field at its empty value.
+void SetCompatibility(Row& row, bool compatible, const char* upgradeModes, const char* reason)
 {
-    row->SetField("ATS Compatible", compatible);
-    row->SetField("ATS Upgrade Modes", upgradeModes);
-    if (reason == nullptr) {
-        row->SetField("ATS Incompatibility Reason", MetaString::New());
-    } else {
-        row->SetField("ATS Incompatibility Reason", reason);
+    row.Set(kCompatible, compatible);
+    row.Set(kUpgradeModes, upgradeModes);
+    if (reason != nullptr) {
+        row.Set(kIncompatibility, reason);
     }
 }
 
+// Fills "ATS Compatible", "ATS Upgrade Modes" and "ATS Incompatibility Reason".
+void UpdateATSCompatibility(bool onlineUpgradeEnabled, HlFileSystem& volume, Row& row)
+{
+    // A volume with only the downgrade-pending bit is judged like an ATS+SCSI one.
+    if ((volume.GetLockMode() & (LockModeBits::AtsOnly | LockModeBits::UpgradePending)) != 0) {
+        SetCompatibility(row, true, "No upgrade needed", nullptr);
+        return;
+    }
+    if (volume.GetMajorVersion() == 3) {
+        SetCompatibility(row, false, "None", "ATS on HLFS-3 not supported");
+        return;
+    }
+    if (volume.GetATSSupport() != 1) {
+        SetCompatibility(row, false, "None", "Device does not support ATS");
+        return;
+    }
+    const bool singleExtent = volume.GetExtents().size() <= 1;
+    SetCompatibility(row, true, singleExtent && onlineUpgradeEnabled ? "Online/Offline" : "Offline", nullptr);
+}
+
+// The volumes named by volume-label and volume-uuid (labels first, every name tried,
+// duplicates kept), or every HLFS volume when none is named. True: go on and produce output
+// from `volumes`; false: stop without output.
+bool GetMultipleHLFSVolumes(const InputPtr& in, const OutputPtr& out,
+                            std::vector<std::unique_ptr<HlFileSystem>>& volumes)
+{
+    std::vector<std::string> labels;
+    std::vector<std::string> uuids;
+    in->GetParameterList(kOptionVolumeLabel, labels);
+    in->GetParameterList(kOptionVolumeUuid, uuids);
+    const bool ignore = in->IsFlagSet(kOptionIgnoreErrors);
+
+    bool ok = true;
+    const bool completed = Guarded(out, [&] {
+        auto storage = OpenHostStorageInfo();
+        if (labels.empty() && uuids.empty()) {
+            volumes = storage->GetHlfsFileSystems(HostCtl::emptyString);
+            return;
+        }
+        auto collect = [&](const std::vector<std::string>& names, VolumeKey key, const char* kind) {
+            for (const auto& name : names) {
+                auto volume = key == VolumeKey::Uuid ? storage->GetHlfsFileSystemByUuid(name)
+                                                     : storage->GetHlfsFileSystemByLabel(name);
+                if (volume) {
+                    volumes.push_back(std::move(volume));
+                } else if (!ignore) {
+                    out->AddErrorMessage(std::string("Error fetching HLFS volume with ") + kind + " '" + name + "'");
+                    ok = false;
+                }
+            }
+        };
+        collect(labels, VolumeKey::Label, "label");
+        collect(uuids, VolumeKey::Uuid, "uuid");
+    });
+    if (!completed) {
+        return ignore;
+    }
+    return ok || ignore;
+}
+
+const CommandDecl kHLFSVolumeLockModeListDecl = {
+    .description = "List the on-disk critical section locking mode for HLFS volumes available on this host.",
+    .result = ListOf(kColumns),
+    .formatter = "table",
+    .examples = {{"", "Show lockmodes for all HLFS volumes."},
+                 {"-l datastore1", "Show lockmode for HLFS volume with label 'datastore1'."},
+                 {"-l datastore1 -l datastore2",
+                  "Show lockmodes for HLFS volume with label 'datastore1' and HLFS volume with label 'datastore2'."},
+                 {"-l datastore1 -u 50ac1b12-6b9eebe0-6765-80c16e6d3408",
+                  "Show lockmodes for HLFS volume with label 'datastore1' and HLFS volume with uuid "
+                  "'50ac1b12-6b9eebe0-6765-80c16e6d3408'."}},
+    .parameters = {LabelParameter("The label of the target HLFS volume.", ParameterType::StringList),
+                   UuidParameter("The uuid of the target HLFS volume.", ParameterType::StringList),
+                   IgnoreErrorsParameter()}};
+
+// storage hlfs lockmode list
+class HLFSVolumeLockModeList final : public StorageCommand {
+    using StorageCommand::StorageCommand;
+
+    void Run(const InputPtr& in, const OutputPtr& out) override
+    {
+        const SkipReport report{"Error getting data for filesystem on '", &HostCtl::Storage::FileSystem::GetMountPoint,
+                                in->IsFlagSet(kOptionIgnoreErrors)};
+        Guarded(out, [&] {
+            const std::optional<bool> onlineUpgradeEnabled = ReadOnlineUpgradeEnabled(out);
+            if (!onlineUpgradeEnabled) {
+                return;
+            }
+            const RowShape shape = Rows();
+            auto list = shape.EmptyList();
+            std::vector<std::unique_ptr<HlFileSystem>> volumes;
+            if (!GetMultipleHLFSVolumes(in, out, volumes)) {
+                return;
+            }
+            ReadEachOrSkip(volumes, report, out, [&](HlFileSystem& volume) {
+                auto row = shape.NewRow();
+                row.Set(kVolumeName, volume.GetVolumeName());
+                row.Set(kUuid, volume.GetUuid());
+                row.Set(kType, GetHLFSVersionString(&volume));
+                row.Set(kLockingMode, TranslateLockMode(volume.GetLockMode()));
+                UpdateATSCompatibility(*onlineUpgradeEnabled, volume, row);
+                list->Add(row.Structure());
+            });
+            out->SetRootObject(list);
+        });
+    }
+};
+
+const VolumeSelectorTexts kLockModeTexts = {"You cannot specify both --ats and --scsi.",
+                                            "The requested lockmode must be specified either by --ats or --scsi.",
+                                            nullptr, nullptr};
+
+const CommandDecl kHLFSVolumeLockModeSetDecl = {
+    .description = "Update the on-disk critical section locking mode for a particular HLFS Volume.",
+    .examples = {{"-a -l datastore1", "Configure HLFS volume with label 'datastore1'for ATS-only locking."},
+                 {"-s -u 50ac1b12-6b9eebe0-6765-80c16e6d3408",
+                  "Configure HLFS volume with uuid '50ac1b12-6b9eebe0-6765-80c16e6d3408' for SCSI locking."}},
+    .parameters = {HlfsLabelParameter(),
+                   HlfsUuidParameter(),
+                   {kAts, "a", ParameterType::Flag, "Enable ATS-only locking."},
+                   {kScsi, "s", ParameterType::Flag, "Enable SCSI locking."}}};
+
+// storage hlfs lockmode set
+class HLFSVolumeLockModeSet final : public StorageCommand {
+    using StorageCommand::StorageCommand;
+
+    void Run(const InputPtr& in, const OutputPtr& out) override
+    {
+        const bool ats = in->IsFlagSet(kAts);
+        const bool scsi = in->IsFlagSet(kScsi);
+        if (!ExactlyOneOf({{ats, kLockModeTexts.both}, {scsi, kLockModeTexts.both}}, kLockModeTexts.neither, out)) {
+            return;
+        }
+        WithSingleHLFSVolume(in, out, [&](HlFileSystem& volume) {
+            // Only the ATS-only bit changes; pending bits are carried over as they are.
+            const unsigned mode = volume.GetLockMode();
+            const bool atsOnly = (mode & LockModeBits::AtsOnly) != 0;
+            if (ats && !atsOnly) {
+                volume.SetLockMode(mode | LockModeBits::AtsOnly);
+            } else if (scsi && atsOnly) {
+                volume.SetLockMode(mode & ~LockModeBits::AtsOnly);
+            }
+            out->SetRootObject(MetaBool::New(true));
+        });
+    }
+};
+
 } // namespace
 
-std::shared_ptr<HLFSVolumeLockModeList> HLFSVolumeLockModeList::New()
-{
-    return std::shared_ptr<HLFSVolumeLockModeList>(new HLFSVolumeLockModeList());
-}
-
-HLFSVolumeLockModeList::HLFSVolumeLockModeList()
-{
-    SetDescription("List the on-disk critical section locking mode for HLFS volumes available on this host.");
-    SetDefaultOutputFormatter("table");
-    SetDefaultOutputParameter("fields:VolumeLockModeConfiguration",
-                              "Volume Name,UUID,Type,Locking Mode,ATS Compatible,ATS Upgrade Modes,ATS "
-                              "Incompatibility Reason");
-}
-
-HLFSVolumeLockModeList::~HLFSVolumeLockModeList() = default;
-
-std::shared_ptr<InputSpec> HLFSVolumeLockModeList::GetInputSpecInternal()
-{
-    AddExample("", "Show lockmodes for all HLFS volumes.");
-    AddExample("-l datastore1", "Show lockmode for HLFS volume with label 'datastore1'.");
-    AddExample("-l datastore1 -l datastore2",
-               "Show lockmodes for HLFS volume with label 'datastore1' and HLFS volume with label 'datastore2'.");
-    AddExample("-l datastore1 -u 50ac1b12-6b9eebe0-6765-80c16e6d3408",
-               "Show lockmodes for HLFS volume with label 'datastore1' and HLFS volume with uuid "
-               "'50ac1b12-6b9eebe0-6765-80c16e6d3408'.");
-    return GetMultipleHLFSVolumesInputSpec();
-}
-
-std::shared_ptr<OutputSpec> HLFSVolumeLockModeList::GetOutputSpecInternal()
-{
-    return ListOutputSpec(GetOutputStructure());
-}
-
-std::shared_ptr<MetaStruct> HLFSVolumeLockModeList::GetOutputStructure()
-{
-    auto row = MetaStruct::New("VolumeLockModeConfiguration");
-    row->SetField("Volume Name", MetaString::New());
-    row->SetField("UUID", MetaString::New());
-    row->SetField("Type", MetaString::New());
-    row->SetField("Locking Mode", MetaString::New());
-    row->SetField("ATS Compatible", MetaBool::New());
-    row->SetField("ATS Upgrade Modes", MetaString::New());
-    row->SetField("ATS Incompatibility Reason", MetaString::New());
-    return row;
-}
-
-const char* HLFSVolumeLockModeList::TranslateLockMode(unsigned mode)
+const char* TranslateLockMode(unsigned mode)
 {
     if ((mode & LockModeBits::AtsOnly) != 0) {
         return "ATS";
@@ -101,124 +215,7 @@ const char* HLFSVolumeLockModeList::TranslateLockMode(unsigned mode)
     return "ATS+SCSI";
 }
 
-void HLFSVolumeLockModeList::UpdateATSCompatibility(bool onlineUpgradeEnabled, HlFileSystem* volume,
-                                                    std::shared_ptr<MetaStruct> row)
-{
-    // A volume with only the downgrade-pending bit is judged like an ATS+SCSI one.
-    if ((volume->GetLockMode() & (LockModeBits::AtsOnly | LockModeBits::UpgradePending)) != 0) {
-        SetCompatibility(row, true, "No upgrade needed", nullptr);
-        return;
-    }
-    if (volume->GetMajorVersion() == 3) {
-        SetCompatibility(row, false, "None", "ATS on HLFS-3 not supported");
-        return;
-    }
-    if (volume->GetATSSupport() != 1) {
-        SetCompatibility(row, false, "None", "Device does not support ATS");
-        return;
-    }
-    const bool singleExtent = volume->GetExtents().size() <= 1;
-    SetCompatibility(row, true, singleExtent && onlineUpgradeEnabled ? "Online/Offline" : "Offline", nullptr);
-}
-
-void HLFSVolumeLockModeList::PopulateLockModeQuerySpec(bool onlineUpgradeEnabled, std::shared_ptr<MetaStruct> row,
-                                                       HlFileSystem* volume)
-{
-    row->SetField("Volume Name", volume->GetVolumeName());
-    row->SetField("UUID", volume->GetUuid());
-    row->SetField("Type", GetHLFSVersionString(volume));
-    row->SetField("Locking Mode", TranslateLockMode(volume->GetLockMode()));
-    UpdateATSCompatibility(onlineUpgradeEnabled, volume, row);
-}
-
-void HLFSVolumeLockModeList::UpdateFilesystemList(const std::vector<std::unique_ptr<HlFileSystem>>& volumes,
-                                                  bool ignoreErrors, bool onlineUpgradeEnabled,
-                                                  std::shared_ptr<MetaList> list, const OutputPtr& out)
-{
-    for (const auto& volume : volumes) {
-        try {
-            auto row = GetOutputStructure();
-            PopulateLockModeQuerySpec(onlineUpgradeEnabled, row, volume.get());
-            list->Add(row);
-        } catch (const HostCtlException& e) {
-            if (!ignoreErrors) {
-                out->AddErrorMessage("Error getting data for filesystem on '" + volume->GetMountPoint() +
-                                     "': " + e.message + ", skipping.");
-            }
-        }
-    }
-}
-
-void HLFSVolumeLockModeList::ExecuteInternal(const InputPtr& in, const OutputPtr& out)
-{
-    const bool ignoreErrors = in->IsFlagSet(kOptionIgnoreErrors);
-    Guarded(out, [&] {
-        const std::optional<bool> onlineUpgradeEnabled = ReadOnlineUpgradeEnabled(out);
-        if (!onlineUpgradeEnabled) {
-            return;
-        }
-        auto list = MetaList::New(MetaType::Struct, GetOutputStructure());
-        std::vector<std::unique_ptr<HlFileSystem>> volumes;
-        if (!GetMultipleHLFSVolumes(in, out, volumes)) {
-            return;
-        }
-        UpdateFilesystemList(volumes, ignoreErrors, *onlineUpgradeEnabled, list, out);
-        out->SetRootObject(list);
-    });
-}
-
-std::shared_ptr<HLFSVolumeLockModeSet> HLFSVolumeLockModeSet::New()
-{
-    return std::shared_ptr<HLFSVolumeLockModeSet>(new HLFSVolumeLockModeSet());
-}
-
-HLFSVolumeLockModeSet::HLFSVolumeLockModeSet()
-{
-    SetDescription("Update the on-disk critical section locking mode for a particular HLFS Volume.");
-}
-
-HLFSVolumeLockModeSet::~HLFSVolumeLockModeSet() = default;
-
-std::shared_ptr<InputSpec> HLFSVolumeLockModeSet::GetInputSpecInternal()
-{
-    AddExample("-a -l datastore1", "Configure HLFS volume with label 'datastore1'for ATS-only locking.");
-    AddExample("-s -u 50ac1b12-6b9eebe0-6765-80c16e6d3408",
-               "Configure HLFS volume with uuid '50ac1b12-6b9eebe0-6765-80c16e6d3408' for SCSI locking.");
-    auto inputs = GetSingleHLFSVolumeInputSpec();
-    AddParameter(inputs, {"ats", "a", ParameterType::Flag, "Enable ATS-only locking."});
-    AddParameter(inputs, {"scsi", "s", ParameterType::Flag, "Enable SCSI locking."});
-    return inputs;
-}
-
-std::shared_ptr<OutputSpec> HLFSVolumeLockModeSet::GetOutputSpecInternal() { return BooleanOutputSpec(); }
-
-void HLFSVolumeLockModeSet::ExecuteInternal(const InputPtr& in, const OutputPtr& out)
-{
-    const bool ats = in->IsFlagSet("ats");
-    const bool scsi = in->IsFlagSet("scsi");
-    if (ats && scsi) {
-        out->AddErrorMessage("You cannot specify both --ats and --scsi.");
-        return;
-    }
-    if (!ats && !scsi) {
-        out->AddErrorMessage("The requested lockmode must be specified either by --ats or --scsi.");
-        return;
-    }
-    const std::unique_ptr<HlFileSystem> volume = GetSingleHLFSVolume(in, out);
-    if (!volume) {
-        return;
-    }
-    Guarded(out, [&] {
-        // Only the ATS-only bit changes; pending bits are carried over as they are.
-        const unsigned mode = volume->GetLockMode();
-        const bool atsOnly = (mode & LockModeBits::AtsOnly) != 0;
-        if (ats && !atsOnly) {
-            volume->SetLockMode(mode | LockModeBits::AtsOnly);
-        } else if (scsi && atsOnly) {
-            volume->SetLockMode(mode & ~LockModeBits::AtsOnly);
-        }
-        out->SetRootObject(MetaBool::New(true));
-    });
-}
+NodePtr NewHLFSVolumeLockModeList() { return New<HLFSVolumeLockModeList>(kHLFSVolumeLockModeListDecl); }
+NodePtr NewHLFSVolumeLockModeSet() { return New<HLFSVolumeLockModeSet>(kHLFSVolumeLockModeSetDecl); }
 
 } // namespace OrvaneCli::FileSystem

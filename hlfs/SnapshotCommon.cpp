@@ -4,6 +4,13 @@
 
 namespace OrvaneCli::FileSystem {
 
+const VolumeSelectorTexts kResolveSnapshotTexts = {
+    "A target snapshot cannot be specified by both volume label and uuid.",
+    "A target HLFS volume must be specified by either volume label or uuid but not both.",
+    "No unresolved HLFS snapshots with volume label '%s' found.",
+    "No unresolved HLFS snapshots with volume UUID '%s' found.",
+};
+
 const char* TranslateSnapshotReason(unsigned code)
 {
     static constexpr std::array<const char*, 8> reasons = {
@@ -17,13 +24,6 @@ const char* TranslateSnapshotReason(unsigned code)
         "the original volume has some extents online",
     };
     return code < reasons.size() ? reasons[code] : "unknown error";
-}
-
-void AddSnapshotSelectionParameters(const std::shared_ptr<InputSpec>& inputs, const char* labelDescription,
-                                    const char* uuidDescription)
-{
-    AddParameter(inputs, {kOptionVolumeLabel, "l", ParameterType::String, labelDescription});
-    AddParameter(inputs, {kOptionVolumeUuid, "u", ParameterType::String, uuidDescription});
 }
 
 SnapshotSelection SnapshotSelection::FromInput(const InputPtr& in)

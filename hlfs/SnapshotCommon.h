@@ -6,22 +6,12 @@
 #include <memory>
 #include <string>
 
-#include "command/Command.h"
+#include "command/Selection.h"
 
 namespace OrvaneCli::FileSystem {
 
-using HostCtl::Storage::UnresolvedHlfsExtent;
-using HostCtl::Storage::UnresolvedHlfsVolume;
-using KnxCtl::Storage::StorageInfoScopedCache;
-using KnxCtl::Storage::UnresolvedHlfsExtentImpl;
-using KnxCtl::Storage::UnresolvedHlfsVolumeImpl;
-
 // The text shown for a CanResolve reason code; unknown codes give "unknown error".
 const char* TranslateSnapshotReason(unsigned code);
-
-// Adds `volume-label` then `volume-uuid`, both optional strings, with the command's own wording.
-void AddSnapshotSelectionParameters(const std::shared_ptr<InputSpec>& inputs, const char* labelDescription,
-                                    const char* uuidDescription);
 
 // Which unresolved copies a snapshot command acts on. An empty value is no filter.
 struct SnapshotSelection {
@@ -38,5 +28,68 @@ struct SnapshotSelection {
 // The entry as the host's implementation class, or null for an empty entry or another class.
 UnresolvedHlfsVolumeImpl* AsSnapshot(const std::unique_ptr<UnresolvedHlfsVolume>& entry);
 UnresolvedHlfsExtentImpl* AsSnapshotExtent(const std::unique_ptr<UnresolvedHlfsExtent>& entry);
+
+// The walk of the two snapshot listings: `each(copy)` for every unresolved copy the input's
+// label and UUID select, with the host's storage information cached meanwhile. A host
+// failure ends the walk with its message; what `each` gathered so far stays.
+template <typename Each>
+void ForEachSelectedSnapshot(const InputPtr& in, const OutputPtr& out, Each&& each)
+{
+    const SnapshotSelection selection = SnapshotSelection::FromInput(in);
+    StorageInfoScopedCache cache(false);
+    WithStorageInfo(StorageInfoPlacement::OutsideGuard, out, [&](StorageInfoImpl& storage) {
+        for (const auto& entry : storage.GetUnresolvedVolumes()) {
+            UnresolvedHlfsVolumeImpl* volume = AsSnapshot(entry);
+            if (volume != nullptr && selection.Matches(*volume)) {
+                each(*volume);
+            }
+        }
+    });
+}
+
+// The two snapshot listings: `each(copy, list)` adds the rows of every selected copy; the
+// list is the result, also when a host failure ended the walk.
+template <typename Each>
+void ListSelectedSnapshots(const InputPtr& in, const OutputPtr& out, const std::shared_ptr<MetaList>& list, Each&& each)
+{
+    ForEachSelectedSnapshot(in, out, [&](UnresolvedHlfsVolumeImpl& volume) { each(volume, *list); });
+    out->SetRootObject(list);
+}
+
+// The texts of the snapshot mount and resignature selection.
+extern const VolumeSelectorTexts kResolveSnapshotTexts;
+
+// The frame of snapshot mount and resignature: exactly one of label and UUID, then
+// `act(copy)` on every matching copy (not only the first). Once the arguments are accepted
+// the result is true, also beside a not-found message or a host failure.
+template <typename Act>
+void ResolveMatchingSnapshots(const InputPtr& in, const OutputPtr& out, Act&& act)
+{
+    bool accepted = false;
+    // The storage information is made before the arguments are looked at.
+    WithStorageInfo(StorageInfoPlacement::OutsideGuard, out, [&](StorageInfoImpl& storage) {
+        const auto choice = ChooseVolume(in, kResolveSnapshotTexts, out);
+        if (!choice) {
+            return;
+        }
+        accepted = true;
+        const SnapshotSelection selection = SnapshotSelection::FromInput(in);
+        int count = 0;
+        for (const auto& entry : storage.GetUnresolvedVolumes()) {
+            UnresolvedHlfsVolumeImpl* volume = AsSnapshot(entry);
+            if (volume == nullptr || !selection.Matches(*volume)) {
+                continue;
+            }
+            act(*volume);
+            ++count;
+        }
+        if (count == 0) {
+            out->AddErrorMessage(VolumeNotFound(*choice, kResolveSnapshotTexts));
+        }
+    });
+    if (accepted) {
+        out->SetRootObject(MetaBool::New(true));
+    }
+}
 
 } // namespace OrvaneCli::FileSystem

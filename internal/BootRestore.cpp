@@ -1,33 +1,27 @@
-#include "internal/BootRestore.h"
+#include "command/StorageCommand.h"
+#include "internal/Manifest.h"
 
-namespace OrvaneCli::Nmp {
+namespace OrvaneCli::FileSystem {
 
-using FileSystem::BooleanOutputSpec;
-using FileSystem::MetaBool;
-using FileSystem::StorageInfoImpl;
-using FileSystem::StorageInfoPlacement;
-using FileSystem::WithStorageInfo;
+namespace {
 
-std::shared_ptr<BootRestore> BootRestore::New() { return std::shared_ptr<BootRestore>(new BootRestore()); }
+// storage internal nmp boot restore: run while the host boots.
+class BootRestore final : public StorageCommand {
+public:
+    BootRestore() : StorageCommand({"Used to restore configuration state at boot time."}) { SetName("restore"); }
 
-BootRestore::BootRestore()
-{
-    SetDescription("Used to restore configuration state at boot time.");
-    SetName("restore");
-}
+private:
+    void Run(const InputPtr&, const OutputPtr& out) override
+    {
+        WithStorageInfo(StorageInfoPlacement::InsideGuard, out,
+                        [](StorageInfoImpl& storage) { storage.RestorePsaConfig(); });
+        // Boot goes on whatever the restore did: the result is true even beside a host message.
+        out->SetRootObject(MetaBool::New(true));
+    }
+};
 
-BootRestore::~BootRestore() = default;
+} // namespace
 
-std::shared_ptr<InputSpec> BootRestore::GetInputSpecInternal() { return InputSpec::New(); }
+NodePtr NewBootRestore() { return New<BootRestore>(); }
 
-std::shared_ptr<OutputSpec> BootRestore::GetOutputSpecInternal() { return BooleanOutputSpec(); }
-
-void BootRestore::ExecuteInternal(const InputPtr&, const OutputPtr& out)
-{
-    WithStorageInfo(StorageInfoPlacement::InsideGuard, out,
-                    [](StorageInfoImpl& storage) { storage.RestorePsaConfig(); });
-    // Boot goes on whatever the restore did: the result is true even beside a host message.
-    out->SetRootObject(MetaBool::New(true));
-}
-
-} // namespace OrvaneCli::Nmp
+} // namespace OrvaneCli::FileSystem

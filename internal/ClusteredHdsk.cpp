@@ -1,76 +1,60 @@
-#include "internal/ClusteredHdsk.h"
-
-#include "hlfs/HlfsVolumeSelection.h"
+#include "command/Selection.h"
+#include "command/StorageCommand.h"
+#include "internal/Manifest.h"
 
 namespace OrvaneCli::FileSystem {
 
 namespace {
 
-constexpr const char* kStructureName = "ClusteredHdskInfo";
-constexpr const char* kEnabledField = "Enabled";
 constexpr const char* kEnabledParameter = "enabled";
+
+enum Field { kEnabledField };
+const ColumnTable kColumns("ClusteredHdskInfo", {{kEnabledField, "Enabled", ColumnType::Bool}}, false);
+
+const CommandDecl kClusteredHdskGetDecl = {.description = "Get information about clustered HDSK support.",
+                                           .result = One(kColumns),
+                                           .formatter = "simple",
+                                           .parameters = {HlfsLabelParameter(), HlfsUuidParameter()}};
+
+// storage internal clusteredhdsk get
+class ClusteredHdskGet final : public StorageCommand {
+    using StorageCommand::StorageCommand;
+
+    void Run(const InputPtr& in, const OutputPtr& out) override
+    {
+        WithSingleHLFSVolume(in, out, [&](HlFileSystem& volume) {
+            const RowShape shape = Rows();
+            auto structure = shape.NewRow();
+            structure.Set(kEnabledField, volume.IsClusteredHdskEnabled());
+            out->SetRootObject(structure.Structure());
+        });
+    }
+};
+
+const CommandDecl kClusteredHdskSetDecl = {
+    .description = "Enable or disable clustered HDSK support.",
+    .parameters = {
+        HlfsLabelParameter(),
+        HlfsUuidParameter(),
+        {kEnabledParameter, "e", ParameterType::Bool, "The new enabled state of the clustered HDSK support.", true}}};
+
+// storage internal clusteredhdsk set
+class ClusteredHdskSet final : public StorageCommand {
+    using StorageCommand::StorageCommand;
+
+    void Run(const InputPtr& in, const OutputPtr& out) override
+    {
+        WithSingleHLFSVolume(in, out, [&](HlFileSystem& volume) {
+            volume.SetClusteredHdskEnabled(in->GetParameterBool(kEnabledParameter));
+            // Set only once the host has taken the change: a failure leaves no result.
+            out->SetRootObject(MetaBool::New(true));
+        });
+    }
+};
 
 } // namespace
 
-std::shared_ptr<ClusteredHdskGet> ClusteredHdskGet::New() { return std::make_shared<ClusteredHdskGet>(); }
-
-ClusteredHdskGet::ClusteredHdskGet()
-{
-    SetDescription("Get information about clustered HDSK support.");
-    SetDefaultOutputFormatter("simple");
-}
-
-ClusteredHdskGet::~ClusteredHdskGet() = default;
-
-std::shared_ptr<InputSpec> ClusteredHdskGet::GetInputSpecInternal() { return GetSingleHLFSVolumeInputSpec(); }
-
-std::shared_ptr<OutputSpec> ClusteredHdskGet::GetOutputSpecInternal()
-{
-    auto structure = MetaStruct::New(kStructureName);
-    structure->SetField(kEnabledField, MetaBool::New());
-    return StructOutputSpec(structure);
-}
-
-void ClusteredHdskGet::ExecuteInternal(const InputPtr& in, const OutputPtr& out)
-{
-    const std::unique_ptr<HlFileSystem> volume = GetSingleHLFSVolume(in, out);
-    if (!volume) {
-        return;
-    }
-    Guarded(out, [&] {
-        auto structure = MetaStruct::New(kStructureName);
-        structure->SetField(kEnabledField, volume->IsClusteredHdskEnabled());
-        out->SetRootObject(structure);
-    });
-}
-
-std::shared_ptr<ClusteredHdskSet> ClusteredHdskSet::New() { return std::make_shared<ClusteredHdskSet>(); }
-
-ClusteredHdskSet::ClusteredHdskSet() { SetDescription("Enable or disable clustered HDSK support."); }
-
-ClusteredHdskSet::~ClusteredHdskSet() = default;
-
-std::shared_ptr<InputSpec> ClusteredHdskSet::GetInputSpecInternal()
-{
-    auto inputs = GetSingleHLFSVolumeInputSpec();
-    AddParameter(inputs, {kEnabledParameter, "e", ParameterType::Bool,
-                        "The new enabled state of the clustered HDSK support.", true});
-    return inputs;
-}
-
-std::shared_ptr<OutputSpec> ClusteredHdskSet::GetOutputSpecInternal() { return BooleanOutputSpec(); }
-
-void ClusteredHdskSet::ExecuteInternal(const InputPtr& in, const OutputPtr& out)
-{
-    const std::unique_ptr<HlFileSystem> volume = GetSingleHLFSVolume(in, out);
-    if (!volume) {
-        return;
-    }
-    Guarded(out, [&] {
-        const bool enabled = in->GetParameterBool(kEnabledParameter);
-        volume->SetClusteredHdskEnabled(enabled);
-        out->SetRootObject(MetaBool::New(true));
-    });
-}
+NodePtr NewClusteredHdskGet() { return New<ClusteredHdskGet>(kClusteredHdskGetDecl); }
+NodePtr NewClusteredHdskSet() { return New<ClusteredHdskSet>(kClusteredHdskSetDecl); }
 
 } // namespace OrvaneCli::FileSystem

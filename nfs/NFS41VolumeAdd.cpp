@@ -1,8 +1,9 @@
-#include "nfs/NFS41VolumeAdd.h"
-
 #include <string>
 #include <vector>
 
+#include "command/Selection.h"
+#include "command/StorageCommand.h"
+#include "nfs/Manifest.h"
 #include "nfs/NfsAddCommon.h"
 
 namespace OrvaneCli::FileSystem {
@@ -27,56 +28,46 @@ NetworkFileSystem::SecurityType ToSecurityType(const std::string& flavour)
     return NetworkFileSystem::SEC_SYS;
 }
 
+const CommandDecl kNFS41VolumeAddDecl = {
+    .description = "Add a new NFS v4.1 volume to the Zephal Host and mount it with the given volume name.",
+    .parameters = {
+        {.name = kOptionHostKnxnic,
+         .shortName = "I",
+         .type = ParameterType::StringList,
+         .description = "The hostname or IP address followed by a colon(:) and knxnic name. This parameter can be "
+                        "specified more than once. E.g.: --host-knxnic=host1:knxnic1 --host-knxnic=ip2:knxnic2",
+         .feature = Feature::Nfs41KnxnicBinding},
+        {.name = kHosts,
+         .shortName = "H",
+         .type = ParameterType::StringList,
+         .description = "The hostname(s) or IP address(es) (comma-separated) of the server for the NFS v4.1 volume to "
+                        "add and mount on the system.",
+         .requiredUnless = Feature::Nfs41KnxnicBinding},
+        {NfsAddArg::kIsPE, "p", ParameterType::Flag, "If set, this flag will set the mount point to be PE."},
+        {NfsAddArg::kShare, "s", ParameterType::String,
+         "The share name on the remote system to use for this NFS v4.1 mount point.", true},
+        {kOptionVolumeName, "v", ParameterType::String,
+         "The volume name to use for the NFS v4.1 mount.  This must be a unique volume name and cannot conflict with "
+         "existing NAS, NFS v4.1, HLFS, or other volume names.",
+         true},
+        {NfsAddArg::kReadOnly, "r", ParameterType::Flag, "If set, this flag will make the mount point be read-only."},
+        {kSecurity, "a", ParameterType::String, "Security flavors. Acceptable values are: %ENUM%.", false,
+         StringEnum({{NetworkFileSystem::NFS_AUTH_SYS_STR.c_str(), "Authentication based on traditional UNIX ID"},
+                     {NetworkFileSystem::NFS_AUTH_KRB5_STR.c_str(),
+                      "Kerberos authentication with RPC header integrity protection"},
+                     {NetworkFileSystem::NFS_AUTH_KRB5I_STR.c_str(),
+                      "Kerberos authentication with data integrity protection"}})}}};
+
+// storage nfs41 add
+class NFS41VolumeAdd final : public StorageCommand {
+    using StorageCommand::StorageCommand;
+
+    void Run(const InputPtr& in, const OutputPtr& out) override;
+};
+
 } // namespace
 
-std::shared_ptr<NFS41VolumeAdd> NFS41VolumeAdd::New() { return std::shared_ptr<NFS41VolumeAdd>(new NFS41VolumeAdd()); }
-
-NFS41VolumeAdd::NFS41VolumeAdd()
-{
-    SetDescription("Add a new NFS v4.1 volume to the Zephal Host and mount it with the given volume name.");
-}
-
-NFS41VolumeAdd::~NFS41VolumeAdd() = default;
-
-std::shared_ptr<InputSpec> NFS41VolumeAdd::GetInputSpecInternal()
-{
-    const bool knxnicBinding = IsFeatureEnabled(Feature::Nfs41KnxnicBinding);
-    auto inputs = InputSpec::New();
-    if (knxnicBinding) {
-        AddParameter(inputs, {NfsAddArg::kHostKnxnic, "I", ParameterType::StringList,
-                            "The hostname or IP address followed by a colon(:) and knxnic name. This parameter can "
-                            "be specified more than once. E.g.: --host-knxnic=host1:knxnic1 "
-                            "--host-knxnic=ip2:knxnic2"});
-    }
-    AddParameter(inputs, {kHosts, "H", ParameterType::StringList,
-                        "The hostname(s) or IP address(es) (comma-separated) of the server for the NFS v4.1 volume "
-                        "to add and mount on the system.",
-                        !knxnicBinding});
-    AddParameter(inputs,
-                 {NfsAddArg::kIsPE, "p", ParameterType::Flag, "If set, this flag will set the mount point to be PE."});
-    AddParameter(inputs, {NfsAddArg::kShare, "s", ParameterType::String,
-                        "The share name on the remote system to use for this NFS v4.1 mount point.", true});
-    AddParameter(inputs, {kOptionVolumeName, "v", ParameterType::String,
-                        "The volume name to use for the NFS v4.1 mount.  This must be a unique volume name and "
-                        "cannot conflict with existing NAS, NFS v4.1, HLFS, or other volume names.",
-                        true});
-    AddParameter(inputs, {NfsAddArg::kReadOnly, "r", ParameterType::Flag,
-                        "If set, this flag will make the mount point be read-only."});
-    AddParameter(
-        inputs,
-        {kSecurity, "a", ParameterType::String, "Security flavors. Acceptable values are: %ENUM%.", false,
-         StringEnum({
-             {NetworkFileSystem::NFS_AUTH_SYS_STR.c_str(), "Authentication based on traditional UNIX ID"},
-             {NetworkFileSystem::NFS_AUTH_KRB5_STR.c_str(),
-              "Kerberos authentication with RPC header integrity protection"},
-             {NetworkFileSystem::NFS_AUTH_KRB5I_STR.c_str(), "Kerberos authentication with data integrity protection"},
-         })});
-    return inputs;
-}
-
-std::shared_ptr<OutputSpec> NFS41VolumeAdd::GetOutputSpecInternal() { return BooleanOutputSpec(); }
-
-void NFS41VolumeAdd::ExecuteInternal(const InputPtr& in, const OutputPtr& out)
+void NFS41VolumeAdd::Run(const InputPtr& in, const OutputPtr& out)
 {
     // The servers come from exactly one of hosts and host-knxnic; host-knxnic texts go to
     // the host as given ("host:knxnic"), unsplit.
@@ -85,9 +76,9 @@ void NFS41VolumeAdd::ExecuteInternal(const InputPtr& in, const OutputPtr& out)
     bool knxnicBound = false;
     if (IsFeatureEnabled(Feature::Nfs41KnxnicBinding)) {
         std::vector<std::string> hostKnxnics;
-        in->GetParameterList(NfsAddArg::kHostKnxnic, hostKnxnics);
-        if (servers.empty() == hostKnxnics.empty()) {
-            out->AddErrorMessage("Either hostName or knxnic should be provided");
+        in->GetParameterList(kOptionHostKnxnic, hostKnxnics);
+        const char* const exactlyOne = "Either hostName or knxnic should be provided";
+        if (!ExactlyOneOf({{!servers.empty(), exactlyOne}, {!hostKnxnics.empty(), exactlyOne}}, exactlyOne, out)) {
             return;
         }
         if (!hostKnxnics.empty()) {
@@ -116,5 +107,7 @@ void NFS41VolumeAdd::ExecuteInternal(const InputPtr& in, const OutputPtr& out)
         }
     });
 }
+
+NodePtr NewNFS41VolumeAdd() { return New<NFS41VolumeAdd>(kNFS41VolumeAddDecl); }
 
 } // namespace OrvaneCli::FileSystem

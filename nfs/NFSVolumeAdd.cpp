@@ -1,7 +1,8 @@
-#include "nfs/NFSVolumeAdd.h"
-
 #include <optional>
 
+#include "command/Selection.h"
+#include "command/StorageCommand.h"
+#include "nfs/Manifest.h"
 #include "nfs/NfsAddCommon.h"
 
 namespace OrvaneCli::FileSystem {
@@ -9,7 +10,6 @@ namespace OrvaneCli::FileSystem {
 namespace {
 
 constexpr const char* kHost = "host";
-constexpr const char* kConnections = "connections";
 constexpr const char* kMountRetry = "unsupported-mount-retry";
 constexpr const char* kQueueDepth = "unsupported-queue-depth";
 
@@ -26,11 +26,11 @@ std::optional<NfsServer> ReadServer(const InputPtr& in, const OutputPtr& out)
     if (!IsFeatureEnabled(Feature::NfsKnxnicBinding)) {
         return NfsServer{in->GetParameter(kHost), false, ""};
     }
-    const std::string& hostKnxnic = in->GetParameter(NfsAddArg::kHostKnxnic);
+    const std::string& hostKnxnic = in->GetParameter(kOptionHostKnxnic);
     const std::string& host = in->GetParameter(kHost);
-    if (IsGiven(hostKnxnic) == IsGiven(host)) {
-        // Scripts match this text, misspelling included.
-        out->AddErrorMessage("Either hostName or knxnic shoud be provided");
+    // Scripts match this text, misspelling included.
+    const char* const exactlyOne = "Either hostName or knxnic shoud be provided";
+    if (!ExactlyOneOf({{IsGiven(host), exactlyOne}, {IsGiven(hostKnxnic), exactlyOne}}, exactlyOne, out)) {
         return std::nullopt;
     }
     if (IsGiven(host)) {
@@ -45,62 +45,54 @@ std::optional<NfsServer> ReadServer(const InputPtr& in, const OutputPtr& out)
     return NfsServer{hostKnxnic.substr(0, colon), true, hostKnxnic.substr(colon + 1)};
 }
 
+const CommandDecl kNFSVolumeAddDecl = {
+    .description = "Add a new NAS volume to the Zephal Host and mount it with the given volume name.",
+    .parameters = {
+        {.name = kHost,
+         .shortName = "H",
+         .type = ParameterType::String,
+         .description = "The hostname or IP address of the NAS volume to add and mount on the system.",
+         .requiredUnless = Feature::NfsKnxnicBinding},
+        {.name = kOptionHostKnxnic,
+         .shortName = "I",
+         .type = ParameterType::String,
+         .description = "The hostname or IP address of the NAS volume to add, followed by a colon(:) and knxnic name "
+                        "i.e. <host/IP>:<knxnic> ",
+         .feature = Feature::NfsKnxnicBinding},
+        {NfsAddArg::kShare, "s", ParameterType::String,
+         "The share name on the remote system to use for this NAS mount point.", true},
+        {kOptionVolumeName, "v", ParameterType::String,
+         "The volume name to use for the NAS mount.  This must be a unique volume name and cannot conflict with "
+         "existing NAS, HLFS or other volume names.",
+         true},
+        {kOptionConnections, "c", ParameterType::Int,
+         "The number of RPC connections to be established for the NFS datastore. Minimum and default values are 1 "
+         "and maximum is 8. A higher number of connections yields better performance on datastores with higher IO "
+         "load.",
+         false, IntRange(1, 8), Feature::NfsConnections},
+        {NfsAddArg::kReadOnly, "r", ParameterType::Flag, "If set this flag will set the mount point to be read-only."},
+        {NfsAddArg::kIsPE, "p", ParameterType::Flag, "If set this flag will set the mount point to be PE."},
+        {kMountRetry, "", ParameterType::Flag, ""},
+        {kQueueDepth, "", ParameterType::Int, "", false, IntRange(1, 4294967295L)}}};
+
+// storage nfs add
+class NFSVolumeAdd final : public StorageCommand {
+    using StorageCommand::StorageCommand;
+
+    void Run(const InputPtr& in, const OutputPtr& out) override;
+};
+
 } // namespace
 
-std::shared_ptr<NFSVolumeAdd> NFSVolumeAdd::New() { return std::shared_ptr<NFSVolumeAdd>(new NFSVolumeAdd()); }
-
-NFSVolumeAdd::NFSVolumeAdd()
-{
-    SetDescription("Add a new NAS volume to the Zephal Host and mount it with the given volume name.");
-}
-
-NFSVolumeAdd::~NFSVolumeAdd() = default;
-
-std::shared_ptr<InputSpec> NFSVolumeAdd::GetInputSpecInternal()
-{
-    const bool knxnicBinding = IsFeatureEnabled(Feature::NfsKnxnicBinding);
-    auto inputs = InputSpec::New();
-    AddParameter(inputs,
-                 {kHost, "H", ParameterType::String,
-                  "The hostname or IP address of the NAS volume to add and mount on the system.", !knxnicBinding});
-    if (knxnicBinding) {
-        AddParameter(inputs, {NfsAddArg::kHostKnxnic, "I", ParameterType::String,
-                            "The hostname or IP address of the NAS volume to add, followed by a colon(:) and knxnic "
-                            "name i.e. <host/IP>:<knxnic> "});
-    }
-    AddParameter(inputs, {NfsAddArg::kShare, "s", ParameterType::String,
-                        "The share name on the remote system to use for this NAS mount point.", true});
-    AddParameter(inputs, {kOptionVolumeName, "v", ParameterType::String,
-                        "The volume name to use for the NAS mount.  This must be a unique volume name and cannot "
-                        "conflict with existing NAS, HLFS or other volume names.",
-                        true});
-    if (IsFeatureEnabled(Feature::NfsConnections)) {
-        AddParameter(inputs, {kConnections, "c", ParameterType::Int,
-                            "The number of RPC connections to be established for the NFS datastore. Minimum and "
-                            "default values are 1 and maximum is 8. A higher number of connections yields better "
-                            "performance on datastores with higher IO load.",
-                            false, IntRange(1, 8)});
-    }
-    AddParameter(inputs, {NfsAddArg::kReadOnly, "r", ParameterType::Flag,
-                        "If set this flag will set the mount point to be read-only."});
-    AddParameter(inputs,
-                 {NfsAddArg::kIsPE, "p", ParameterType::Flag, "If set this flag will set the mount point to be PE."});
-    AddParameter(inputs, {kMountRetry, "", ParameterType::Flag, ""});
-    AddParameter(inputs, {kQueueDepth, "", ParameterType::Int, "", false, IntRange(1, 4294967295L)});
-    return inputs;
-}
-
-std::shared_ptr<OutputSpec> NFSVolumeAdd::GetOutputSpecInternal() { return BooleanOutputSpec(); }
-
-void NFSVolumeAdd::ExecuteInternal(const InputPtr& in, const OutputPtr& out)
+void NFSVolumeAdd::Run(const InputPtr& in, const OutputPtr& out)
 {
     const std::string& share = in->GetParameter(NfsAddArg::kShare);
     const std::string& volumeName = in->GetParameter(kOptionVolumeName);
     const bool readOnly = in->IsFlagSet(NfsAddArg::kReadOnly);
 
     std::int64_t connections = 1;
-    if (IsFeatureEnabled(Feature::NfsConnections) && in->HasParameter(kConnections)) {
-        connections = in->GetParameterInt(kConnections);
+    if (IsFeatureEnabled(Feature::NfsConnections) && in->HasParameter(kOptionConnections)) {
+        connections = in->GetParameterInt(kOptionConnections);
     }
 
     const std::optional<NfsServer> server = ReadServer(in, out);
@@ -137,5 +129,7 @@ void NFSVolumeAdd::ExecuteInternal(const InputPtr& in, const OutputPtr& out)
         }
     });
 }
+
+NodePtr NewNFSVolumeAdd() { return New<NFSVolumeAdd>(kNFSVolumeAddDecl); }
 
 } // namespace OrvaneCli::FileSystem

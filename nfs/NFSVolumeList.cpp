@@ -1,46 +1,12 @@
-#include "nfs/NFSVolumeList.h"
+#include "command/Selection.h"
+#include "command/StorageCommand.h"
+#include "nfs/Manifest.h"
 
 namespace OrvaneCli::FileSystem {
 
 using HostCtl::Storage::QAXIState;
 
-std::shared_ptr<MetaStruct> MakeStructure(const char* name, std::initializer_list<FieldDecl> fields)
-{
-    auto structure = MetaStruct::New(name);
-    for (const FieldDecl& field : fields) {
-        if (!field.present) {
-            continue;
-        }
-        switch (field.kind) {
-        case FieldKind::String:
-            structure->SetField(field.title, MetaString::New());
-            break;
-        case FieldKind::Int:
-            structure->SetField(field.title, MetaInt::New());
-            break;
-        case FieldKind::Bool:
-            structure->SetField(field.title, MetaBool::New());
-            break;
-        }
-    }
-    return structure;
-}
-
-std::string JoinWithCommas(const std::vector<std::string>& entries)
-{
-    std::string joined;
-    for (std::size_t i = 0; i < entries.size(); ++i) {
-        if (i > 0) {
-            joined += ',';
-        }
-        joined += entries[i];
-    }
-    return joined;
-}
-
-namespace {
-
-const char* HardwareAccelerationText(QAXIState state)
+const char* TranslateQAXI(QAXIState state)
 {
     switch (state) {
     case HostCtl::Storage::QAXI_SUPPORTED:
@@ -52,154 +18,7 @@ const char* HardwareAccelerationText(QAXIState state)
     }
 }
 
-StorageInfoImpl::NetworkFileSystemFilter ListFilter(const InputPtr& in)
-{
-    return in->IsFlagSet("pe-only") ? &StorageInfoImpl::IsPE : &StorageInfoImpl::IsNotHidden;
-}
-
-// The switches as one execution sees them, so that its rows all have one shape.
-struct V3ListFeatures {
-    bool knxnic = IsFeatureEnabled(Feature::NfsKnxnicBinding);
-    bool connections = IsFeatureEnabled(Feature::NfsConnections);
-};
-
-std::shared_ptr<MetaStruct> MakeV3Row(const V3ListFeatures& features)
-{
-    return MakeStructure("NasMount", {
-                                          {"Volume Name", FieldKind::String},
-                                          {"Host", FieldKind::String},
-                                          {"Share", FieldKind::String},
-                                          {"Knxnic", FieldKind::String, features.knxnic},
-                                          {"Connections", FieldKind::Int, features.connections},
-                                          {"Accessible", FieldKind::Bool},
-                                          {"Mounted", FieldKind::Bool},
-                                          {"Read-Only", FieldKind::Bool},
-                                          {"isPE", FieldKind::Bool},
-                                          {"Hardware Acceleration", FieldKind::String},
-                                      });
-}
-
-std::shared_ptr<MetaStruct> MakeV41Row(bool knxnics)
-{
-    return MakeStructure("NasMount", {
-                                          {"Volume Name", FieldKind::String},
-                                          {"Host(s)", FieldKind::String},
-                                          {"Share", FieldKind::String},
-                                          {"Knxnics", FieldKind::String, knxnics},
-                                          {"Accessible", FieldKind::Bool},
-                                          {"Mounted", FieldKind::Bool},
-                                          {"Read-Only", FieldKind::Bool},
-                                          {"Security", FieldKind::String},
-                                          {"isPE", FieldKind::Bool},
-                                          {"Hardware Acceleration", FieldKind::String},
-                                      });
-}
-
-std::shared_ptr<InputSpec> PeOnlyInputSpec(const char* description)
-{
-    auto inputs = InputSpec::New();
-    AddParameter(inputs, {"pe-only", "p", ParameterType::Flag, description});
-    return inputs;
-}
-
-} // namespace
-
-// ---- storage nfs list ----
-
-std::shared_ptr<NFSVolumeList> NFSVolumeList::New() { return std::shared_ptr<NFSVolumeList>(new NFSVolumeList()); }
-
-NFSVolumeList::NFSVolumeList()
-{
-    SetDescription("List the NAS volumes currently known to the Zephal host.");
-    SetDefaultOutputFormatter("table");
-    const V3ListFeatures features;
-    const char* fields = "Volume Name,Host,Share,Accessible,Mounted,Read-Only,isPE,Hardware Acceleration";
-    if (features.knxnic && features.connections) {
-        fields = "Volume Name,Host,Share,Knxnic,Accessible,Mounted,Connections,Read-Only,isPE,Hardware Acceleration";
-    } else if (features.knxnic) {
-        fields = "Volume Name,Host,Share,Knxnic,Accessible,Mounted,Read-Only,isPE,Hardware Acceleration";
-    } else if (features.connections) {
-        fields = "Volume Name,Host,Share,Accessible,Mounted,Connections,Read-Only,isPE,Hardware Acceleration";
-    }
-    SetDefaultOutputParameter("fields:NasMount", fields);
-}
-
-NFSVolumeList::~NFSVolumeList() = default;
-
-std::shared_ptr<InputSpec> NFSVolumeList::GetInputSpecInternal()
-{
-    return PeOnlyInputSpec("Filter the output to only show TVol PE volumes");
-}
-
-std::shared_ptr<OutputSpec> NFSVolumeList::GetOutputSpecInternal() { return ListOutputSpec(GetOutputStructure()); }
-
-std::shared_ptr<MetaStruct> NFSVolumeList::GetOutputStructure() { return MakeV3Row(V3ListFeatures{}); }
-
-void NFSVolumeList::ExecuteInternal(const InputPtr& in, const OutputPtr& out)
-{
-    const auto filter = ListFilter(in);
-    const V3ListFeatures features;
-    auto rows = MetaList::New(MetaType::Struct, MakeV3Row(features));
-    WithStorageInfo(StorageInfoPlacement::InsideGuard, out, [&](StorageInfoImpl& storage) {
-        const auto volumes = storage.GetV3NetworkFileSystems(filter);
-        for (const auto& volume : volumes) {
-            ForVolumeOrSkip(*volume, "data", out, [&] {
-                auto row = MakeV3Row(features);
-                row->SetField("Hardware Acceleration", "Unknown");
-                row->SetField("Volume Name", volume->GetVolumeName());
-                row->SetField("Host", volume->GetRemoteHost());
-                row->SetField("Share", volume->GetRemoteShare());
-                if (features.knxnic) {
-                    row->SetField("Knxnic", volume->GetKnxnic());
-                }
-                if (features.connections) {
-                    row->SetField("Connections", static_cast<long>(volume->GetConnections()));
-                }
-                row->SetField("Accessible", volume->IsAccessible());
-                row->SetField("Mounted", volume->IsMounted());
-                row->SetField("Read-Only", volume->IsReadOnly());
-                row->SetField("isPE", volume->IsPE());
-                row->SetField("Hardware Acceleration", HardwareAccelerationText(volume->GetQAXIState()));
-                rows->Add(row);
-            });
-        }
-        out->SetRootObject(rows);
-    });
-}
-
-// ---- storage nfs41 list ----
-
-std::shared_ptr<NFS41VolumeList> NFS41VolumeList::New()
-{
-    return std::shared_ptr<NFS41VolumeList>(new NFS41VolumeList());
-}
-
-NFS41VolumeList::NFS41VolumeList()
-{
-    SetDescription("List the NFS v4.1 volumes currently known to the Zephal host.");
-    SetDefaultOutputFormatter("table");
-    SetDefaultOutputParameter(
-        "fields:NasMount",
-        IsFeatureEnabled(Feature::Nfs41KnxnicBinding)
-            ? "Volume Name,Host(s),Share,Knxnics,Accessible,Mounted,Read-Only,Security,isPE,Hardware Acceleration"
-            : "Volume Name,Host(s),Share,Accessible,Mounted,Read-Only,Security,isPE,Hardware Acceleration");
-}
-
-NFS41VolumeList::~NFS41VolumeList() = default;
-
-std::shared_ptr<InputSpec> NFS41VolumeList::GetInputSpecInternal()
-{
-    return PeOnlyInputSpec("Filter the output to only show TVol PE Volumes");
-}
-
-std::shared_ptr<OutputSpec> NFS41VolumeList::GetOutputSpecInternal() { return ListOutputSpec(GetOutputStructure()); }
-
-std::shared_ptr<MetaStruct> NFS41VolumeList::GetOutputStructure()
-{
-    return MakeV41Row(IsFeatureEnabled(Feature::Nfs41KnxnicBinding));
-}
-
-const std::string& NFS41VolumeList::TranslateSecurity(NetworkFileSystem::SecurityType security)
+const std::string& TranslateSecurity(NetworkFileSystem::SecurityType security)
 {
     switch (security) {
     case NetworkFileSystem::SEC_NONE:
@@ -216,35 +35,127 @@ const std::string& NFS41VolumeList::TranslateSecurity(NetworkFileSystem::Securit
     return NetworkFileSystem::NFS_AUTH_UNKNOWN_STR;
 }
 
-const char* NFS41VolumeList::TranslateQAXI(QAXIState state) { return HardwareAccelerationText(state); }
+namespace {
 
-void NFS41VolumeList::ExecuteInternal(const InputPtr& in, const OutputPtr& out)
-{
-    const auto filter = ListFilter(in);
-    const bool knxnics = IsFeatureEnabled(Feature::Nfs41KnxnicBinding);
-    auto rows = MetaList::New(MetaType::Struct, MakeV41Row(knxnics));
-    WithStorageInfo(StorageInfoPlacement::InsideGuard, out, [&](StorageInfoImpl& storage) {
-        const auto volumes = storage.GetV41NetworkFileSystems(filter);
-        for (const auto& volume : volumes) {
-            ForVolumeOrSkip(*volume, "data", out, [&] {
-                auto row = MakeV41Row(knxnics);
-                row->SetField("Volume Name", volume->GetVolumeName());
-                row->SetField("Host(s)", JoinWithCommas(volume->GetRemoteHosts()));
-                row->SetField("Share", volume->GetRemoteShare());
-                if (knxnics) {
-                    row->SetField("Knxnics", volume->GetKnxnics());
-                }
-                row->SetField("Accessible", volume->IsAccessible());
-                row->SetField("Mounted", volume->IsMounted());
-                row->SetField("Read-Only", volume->GetReadOnlyState());
-                row->SetField("Security", TranslateSecurity(volume->GetSecurityType()));
-                row->SetField("isPE", volume->IsPE());
-                row->SetField("Hardware Acceleration", TranslateQAXI(volume->GetQAXIState()));
-                rows->Add(row);
-            });
-        }
-        out->SetRootObject(rows);
+const char* const kPeOnly = "pe-only";
+// The fields of both lists; each version's table holds its own.
+enum Field {
+    kVolumeName,
+    kHost,
+    kHosts,
+    kShare,
+    kKnxnic,
+    kKnxnics,
+    kConnections,
+    kAccessible,
+    kMounted,
+    kReadOnly,
+    kSecurity,
+    kIsPE,
+    kAcceleration
+};
+
+const ColumnTable kV3Columns(
+    "NasMount",
+    {
+        {kVolumeName, "Volume Name"},
+        {kHost, "Host"},
+        {kShare, "Share"},
+        {kKnxnic, "Knxnic", ColumnType::String, {.feature = Feature::NfsKnxnicBinding}},
+        {kConnections, "Connections", ColumnType::Int, {.feature = Feature::NfsConnections, .shownAfter = kMounted}},
+        {kAccessible, "Accessible", ColumnType::Bool},
+        {kMounted, "Mounted", ColumnType::Bool},
+        {kReadOnly, "Read-Only", ColumnType::Bool},
+        {kIsPE, "isPE", ColumnType::Bool},
+        {kAcceleration, "Hardware Acceleration"},
     });
+
+const ColumnTable kV41Columns("NasMount",
+                              {
+                                  {kVolumeName, "Volume Name"},
+                                  {kHosts, "Host(s)"},
+                                  {kShare, "Share"},
+                                  {kKnxnics, "Knxnics", ColumnType::String, {.feature = Feature::Nfs41KnxnicBinding}},
+                                  {kAccessible, "Accessible", ColumnType::Bool},
+                                  {kMounted, "Mounted", ColumnType::Bool},
+                                  {kReadOnly, "Read-Only", ColumnType::Bool},
+                                  {kSecurity, "Security"},
+                                  {kIsPE, "isPE", ColumnType::Bool},
+                                  {kAcceleration, "Hardware Acceleration"},
+                              });
+
+// One row of either list, in the order the host is asked; the row's shape says which
+// version's fields it has.
+void FillRow(NetworkFileSystem& volume, const RowShape& shape, Row& row)
+{
+    const bool v41 = shape.Has(kHosts);
+    row.Set(kVolumeName, volume.GetVolumeName());
+    if (v41) {
+        row.Set(kHosts, JoinWithCommas(volume.GetRemoteHosts()));
+    } else {
+        row.Set(kHost, volume.GetRemoteHost());
+    }
+    row.Set(kShare, volume.GetRemoteShare());
+    if (shape.Has(kKnxnic)) {
+        row.Set(kKnxnic, volume.GetKnxnic());
+    }
+    if (shape.Has(kKnxnics)) {
+        row.Set(kKnxnics, volume.GetKnxnics());
+    }
+    if (shape.Has(kConnections)) {
+        row.Set(kConnections, static_cast<long>(volume.GetConnections()));
+    }
+    row.Set(kAccessible, volume.IsAccessible());
+    row.Set(kMounted, volume.IsMounted());
+    row.Set(kReadOnly, v41 ? volume.GetReadOnlyState() : volume.IsReadOnly());
+    if (v41) {
+        row.Set(kSecurity, TranslateSecurity(volume.GetSecurityType()));
+    }
+    row.Set(kIsPE, volume.IsPE());
+    row.Set(kAcceleration, TranslateQAXI(volume.GetQAXIState()));
 }
+
+const CommandDecl kV3Decl = {
+    .description = "List the NAS volumes currently known to the Zephal host.",
+    .result = ListOf(kV3Columns),
+    .formatter = "table",
+    .parameters = {{kPeOnly, "p", ParameterType::Flag, "Filter the output to only show TVol PE volumes"}}};
+
+const CommandDecl kV41Decl = {
+    .description = "List the NFS v4.1 volumes currently known to the Zephal host.",
+    .result = ListOf(kV41Columns),
+    .formatter = "table",
+    .parameters = {{kPeOnly, "p", ParameterType::Flag, "Filter the output to only show TVol PE Volumes"}}};
+
+// storage nfs list, storage nfs41 list: one row per volume of that version the filter lets
+// through; a volume that cannot be read is reported and left out.
+template <HostCtl::Storage::NfsVersion kVersion>
+class NfsVolumeList final : public StorageCommand {
+    using StorageCommand::StorageCommand;
+
+    void Run(const InputPtr& in, const OutputPtr& out) override
+    {
+        const auto filter = in->IsFlagSet(kPeOnly) ? &StorageInfoImpl::IsPE : &StorageInfoImpl::IsNotHidden;
+        // The switches as one execution sees them, so that its rows all have one shape.
+        const RowShape shape = Rows();
+        auto rows = shape.EmptyList();
+        const SkipReport report{"Error getting data for mount '", &HostCtl::Storage::FileSystem::GetVolumeName};
+        WithStorageInfo(StorageInfoPlacement::InsideGuard, out, [&](StorageInfoImpl& storage) {
+            const auto volumes = kVersion == HostCtl::Storage::NFS_VERSION_41 ? storage.GetV41NetworkFileSystems(filter)
+                                                                              : storage.GetV3NetworkFileSystems(filter);
+            ReadEachOrSkip(volumes, report, out, [&](NetworkFileSystem& volume) {
+                auto row = shape.NewRow();
+                FillRow(volume, shape, row);
+                rows->Add(row.Structure());
+            });
+            out->SetRootObject(rows);
+        });
+    }
+};
+
+} // namespace
+
+NodePtr NewNFSVolumeList() { return New<NfsVolumeList<HostCtl::Storage::NFS_VERSION_3>>(kV3Decl); }
+NodePtr NewNFS41VolumeList() { return New<NfsVolumeList<HostCtl::Storage::NFS_VERSION_41>>(kV41Decl); }
 
 } // namespace OrvaneCli::FileSystem

@@ -1,16 +1,14 @@
-#include "nfs/NFSVolumeParam.h"
-
 #include <vector>
 
-#include "nfs/NFSVolumeList.h"
+#include "command/Selection.h"
+#include "command/StorageCommand.h"
+#include "nfs/Manifest.h"
 
 namespace OrvaneCli::FileSystem {
 
 namespace {
 constexpr const char* kMaxQueueDepth = "maxqueuedepth";
 constexpr const char* kKnxnic = "knxnic";
-constexpr const char* kConnections = "connections";
-constexpr const char* kHostKnxnic = "host-knxnic";
 constexpr const char* kAllVolumes = "all";
 
 // The non-PE volumes of one NFS version.
@@ -26,56 +24,46 @@ std::vector<std::unique_ptr<NetworkFileSystem>> NonPEV41Volumes(StorageInfoImpl&
     return storage.GetV41NetworkFileSystems(&StorageInfoImpl::IsNotPE);
 }
 
-struct V3ParamFeatures {
-    bool knxnic = IsFeatureEnabled(Feature::NfsKnxnicBinding);
-    bool connections = IsFeatureEnabled(Feature::NfsConnections);
+// The first four fields are the same in both versions; each adds its own after them.
+enum Field {
+    kVolumeNameField,
+    kMaxQueueDepthField,
+    kMaxReadField,
+    kMaxWriteField,
+    kKnxnicField,
+    kKnxnicsField,
+    kConnectionsField
 };
 
-std::shared_ptr<MetaStruct> MakeV3ParamRow(const V3ParamFeatures& features)
-{
-    return MakeStructure("NasMountParams", {
-                                                {"Volume Name", FieldKind::String},
-                                                {"MaxQueueDepth", FieldKind::Int},
-                                                {"MaxReadTransferSize", FieldKind::Int},
-                                                {"MaxWriteTransferSize", FieldKind::Int},
-                                                {"Knxnic", FieldKind::String, features.knxnic},
-                                                {"Connections", FieldKind::Int, features.connections},
-                                            });
-}
+const ColumnTable kV3Columns(
+    "NasMountParams", {
+                          {kVolumeNameField, "Volume Name"},
+                          {kMaxQueueDepthField, "MaxQueueDepth", ColumnType::Int},
+                          {kMaxReadField, "MaxReadTransferSize", ColumnType::Int},
+                          {kMaxWriteField, "MaxWriteTransferSize", ColumnType::Int},
+                          {kKnxnicField, "Knxnic", ColumnType::String, {.feature = Feature::NfsKnxnicBinding}},
+                          {kConnectionsField, "Connections", ColumnType::Int, {.feature = Feature::NfsConnections}},
+                      });
 
-std::shared_ptr<MetaStruct> MakeV41ParamRow(bool knxnics)
-{
-    return MakeStructure("NasMountParams", {
-                                                {"Volume Name", FieldKind::String},
-                                                {"MaxQueueDepth", FieldKind::Int},
-                                                {"MaxReadTransferSize", FieldKind::Int},
-                                                {"MaxWriteTransferSize", FieldKind::Int},
-                                                {"Knxnics", FieldKind::String, knxnics},
-                                            });
-}
-
-constexpr const char* kBaseParamFields = "Volume Name, MaxQueueDepth, MaxReadTransferSize, MaxWriteTransferSize";
-
-std::shared_ptr<InputSpec> VolumeNameInputSpec(const char* description)
-{
-    auto inputs = InputSpec::New();
-    AddParameter(inputs, {kOptionVolumeName, "v", ParameterType::String, description, true});
-    return inputs;
-}
-
-void AddMaxQueueDepthParameter(const std::shared_ptr<InputSpec>& inputs, const char* description)
-{
-    AddParameter(inputs, {kMaxQueueDepth, "q", ParameterType::Int, description, false, IntRange(1, 4294967295L)});
-}
+const ColumnTable kV41Columns(
+    "NasMountParams", {
+                          {kVolumeNameField, "Volume Name"},
+                          {kMaxQueueDepthField, "MaxQueueDepth", ColumnType::Int},
+                          {kMaxReadField, "MaxReadTransferSize", ColumnType::Int},
+                          {kMaxWriteField, "MaxWriteTransferSize", ColumnType::Int},
+                          {kKnxnicsField, "Knxnics", ColumnType::String, {.feature = Feature::Nfs41KnxnicBinding}},
+                      });
 
 // Rows of the non-PE volumes named `name` (only the first that could be read), or of every
-// one for "all". `makeRow` gives an empty row; `fillExtras` sets the fields after the sizes.
-template <typename MakeRow, typename FillExtras>
-void ListVolumeParams(const std::string& name, VolumeQuery query, const OutputPtr& out, MakeRow&& makeRow,
+// one for "all". `fillExtras` sets the fields after the sizes. A volume's name is read outside
+// the skip region: failing to read it ends the listing.
+template <typename FillExtras>
+void ListVolumeParams(const std::string& name, VolumeQuery query, const RowShape& shape, const OutputPtr& out,
                       FillExtras&& fillExtras)
 {
     const bool all = name == kAllVolumes;
-    auto rows = MetaList::New(MetaType::Struct, makeRow());
+    auto rows = shape.EmptyList();
+    const SkipReport report{"Error getting params for mount '", &HostCtl::Storage::FileSystem::GetVolumeName};
     WithStorageInfo(StorageInfoPlacement::InsideGuard, out, [&](StorageInfoImpl& storage) {
         const auto volumes = query(storage);
         for (const auto& volume : volumes) {
@@ -83,16 +71,14 @@ void ListVolumeParams(const std::string& name, VolumeQuery query, const OutputPt
             if (!all && volumeName != name) {
                 continue;
             }
-            bool added = false;
-            ForVolumeOrSkip(*volume, "params", out, [&] {
-                auto row = makeRow();
-                row->SetField("Volume Name", volumeName);
-                row->SetField("MaxQueueDepth", static_cast<long>(volume->GetMaxQueueDepth()));
-                row->SetField("MaxReadTransferSize", static_cast<long>(volume->GetMaxReadTransferSize()));
-                row->SetField("MaxWriteTransferSize", static_cast<long>(volume->GetMaxWriteTransferSize()));
-                fillExtras(*volume, *row);
-                rows->Add(row);
-                added = true;
+            const bool added = ReadOrSkip(*volume, report, out, [&](NetworkFileSystem& readable) {
+                auto row = shape.NewRow();
+                row.Set(kVolumeNameField, volumeName);
+                row.Set(kMaxQueueDepthField, static_cast<long>(readable.GetMaxQueueDepth()));
+                row.Set(kMaxReadField, static_cast<long>(readable.GetMaxReadTransferSize()));
+                row.Set(kMaxWriteField, static_cast<long>(readable.GetMaxWriteTransferSize()));
+                fillExtras(readable, row);
+                rows->Add(row.Structure());
             });
             if (added && !all) {
                 break;
@@ -139,194 +125,119 @@ void ApplyMaxQueueDepth(const InputPtr& in, NetworkFileSystem& volume)
     }
 }
 
+ParameterDecl MaxQueueDepthParameter(const char* description)
+{
+    return {kMaxQueueDepth, "q", ParameterType::Int, description, false, IntRange(1, 4294967295L)};
+}
+
+// storage nfs param get, storage nfs41 param get: the row's shape says which fields follow
+// the sizes.
+template <HostCtl::Storage::NfsVersion kVersion>
+class NfsParamGet final : public StorageCommand {
+    using StorageCommand::StorageCommand;
+
+    void Run(const InputPtr& in, const OutputPtr& out) override
+    {
+        const RowShape shape = Rows();
+        const VolumeQuery query = kVersion == HostCtl::Storage::NFS_VERSION_41 ? NonPEV41Volumes : NonPEV3Volumes;
+        ListVolumeParams(in->GetParameter(kOptionVolumeName), query, shape, out,
+                         [&](NetworkFileSystem& volume, Row& row) {
+                             if (shape.Has(kKnxnicField)) {
+                                 row.Set(kKnxnicField, volume.GetKnxnics());
+                             }
+                             if (shape.Has(kKnxnicsField)) {
+                                 row.Set(kKnxnicsField, volume.GetKnxnics());
+                             }
+                             if (shape.Has(kConnectionsField)) {
+                                 row.Set(kConnectionsField, static_cast<long>(volume.GetConnectionsParam()));
+                             }
+                         });
+    }
+};
+
+const CommandDecl kV3GetDecl = {
+    .description = "Get the volume parameters of the NAS volumes.",
+    .result = ListOf(kV3Columns),
+    .formatter = "table",
+    .parameters = {{kOptionVolumeName, "v", ParameterType::String, "NAS volume name(\"all\" to list all).", true}}};
+
+const CommandDecl kV41GetDecl = {.description = "Get the volume parameters of the NFS v4.1 volumes.",
+                                 .result = ListOf(kV41Columns),
+                                 .formatter = "table",
+                                 .parameters = {{kOptionVolumeName, "v", ParameterType::String,
+                                                 "NFS v4.1 volume name(\"all\" to list all).", true}}};
+
+const CommandDecl kNFSVolumeParamSetDecl = {
+    .description = "Set the volume parameters of the NAS volumes.",
+    .parameters = {{kOptionVolumeName, "v", ParameterType::String, "The NAS volume name.", true},
+                   MaxQueueDepthParameter("The maximum queue depth for the NAS volume."),
+                   {kKnxnic, "I", ParameterType::String, "The new knxnic to be configured for the NAS volume.", false,
+                    nullptr, Feature::NfsKnxnicBinding},
+                   {kOptionConnections, "c", ParameterType::Int,
+                    "The number of RPC connections to be established for the NFS datastore. A higher number of "
+                    "connections yields better performance on datastores with higher IO load.",
+                    false, IntRange(1, 8), Feature::NfsConnections}}};
+
+// storage nfs param set
+class NFSVolumeParamSet final : public StorageCommand {
+    using StorageCommand::StorageCommand;
+
+    void Run(const InputPtr& in, const OutputPtr& out) override
+    {
+        const bool knxnicBinding = IsFeatureEnabled(Feature::NfsKnxnicBinding);
+        const bool connections = IsFeatureEnabled(Feature::NfsConnections);
+        // Only parameters the switches declared are read.
+        const std::string knxnic = knxnicBinding ? in->GetParameter(kKnxnic) : std::string();
+        const bool setKnxnic = IsGiven(knxnic);
+        const bool setConnections = connections && in->HasParameter(kOptionConnections);
+        SetVolumeParams(
+            in->GetParameter(kOptionVolumeName), NonPEV3Volumes, "NAS", out, [&](NetworkFileSystem& volume) {
+                ApplyMaxQueueDepth(in, volume);
+                if (setKnxnic) {
+                    volume.SetKnxnics(knxnic);
+                }
+                if (setConnections) {
+                    volume.SetConnectionsParam(static_cast<std::int32_t>(in->GetParameterInt(kOptionConnections)));
+                }
+            });
+    }
+};
+
+const CommandDecl kNFS41VolumeParamSetDecl = {
+    .description = "Set the volume parameters of the NFS v4.1 volumes.",
+    .parameters = {{kOptionVolumeName, "v", ParameterType::String, "The NFS v4.1 volume name.", true},
+                   MaxQueueDepthParameter("The maximum queue depth for the NFS v4.1 volume."),
+                   {kOptionHostKnxnic, "I", ParameterType::StringList,
+                    "The hostname or IP address followed by a colon(:) and knxnic name. This parameter can be "
+                    "specified more than once. E.g.: --host-knxnic=host1:knxnic1 --host-knxnic=ip2:knxnic2",
+                    false, nullptr, Feature::Nfs41KnxnicBinding}}};
+
+// storage nfs41 param set
+class NFS41VolumeParamSet final : public StorageCommand {
+    using StorageCommand::StorageCommand;
+
+    void Run(const InputPtr& in, const OutputPtr& out) override
+    {
+        std::vector<std::string> hostKnxnics;
+        if (IsFeatureEnabled(Feature::Nfs41KnxnicBinding)) {
+            in->GetParameterList(kOptionHostKnxnic, hostKnxnics);
+        }
+        const std::string knxnics = JoinWithCommas(hostKnxnics);
+        SetVolumeParams(in->GetParameter(kOptionVolumeName), NonPEV41Volumes, "NFS v4.1", out,
+                        [&](NetworkFileSystem& volume) {
+                            ApplyMaxQueueDepth(in, volume);
+                            if (!hostKnxnics.empty()) {
+                                volume.SetKnxnics(knxnics);
+                            }
+                        });
+    }
+};
+
 } // namespace
 
-// ---- storage nfs param get ----
-
-std::shared_ptr<NFSVolumeParamGet> NFSVolumeParamGet::New()
-{
-    return std::shared_ptr<NFSVolumeParamGet>(new NFSVolumeParamGet());
-}
-
-NFSVolumeParamGet::NFSVolumeParamGet()
-{
-    SetDescription("Get the volume parameters of the NAS volumes.");
-    SetDefaultOutputFormatter("table");
-    const V3ParamFeatures features;
-    std::string fields = kBaseParamFields;
-    if (features.knxnic) {
-        fields += ", Knxnic";
-    }
-    if (features.connections) {
-        fields += ", Connections";
-    }
-    SetDefaultOutputParameter("fields:NasMountParams", fields);
-}
-
-NFSVolumeParamGet::~NFSVolumeParamGet() = default;
-
-std::shared_ptr<InputSpec> NFSVolumeParamGet::GetInputSpecInternal()
-{
-    return VolumeNameInputSpec("NAS volume name(\"all\" to list all).");
-}
-
-std::shared_ptr<OutputSpec> NFSVolumeParamGet::GetOutputSpecInternal() { return ListOutputSpec(GetOutputStructure()); }
-
-std::shared_ptr<MetaStruct> NFSVolumeParamGet::GetOutputStructure() { return MakeV3ParamRow(V3ParamFeatures{}); }
-
-void NFSVolumeParamGet::ExecuteInternal(const InputPtr& in, const OutputPtr& out)
-{
-    const V3ParamFeatures features;
-    ListVolumeParams(
-        in->GetParameter(kOptionVolumeName), NonPEV3Volumes, out,
-        [&] { return MakeV3ParamRow(features); },
-        [&](NetworkFileSystem& volume, MetaStruct& row) {
-            if (features.knxnic) {
-                row.SetField("Knxnic", volume.GetKnxnics());
-            }
-            if (features.connections) {
-                row.SetField("Connections", static_cast<long>(volume.GetConnectionsParam()));
-            }
-        });
-}
-
-// ---- storage nfs param set ----
-
-std::shared_ptr<NFSVolumeParamSet> NFSVolumeParamSet::New()
-{
-    return std::shared_ptr<NFSVolumeParamSet>(new NFSVolumeParamSet());
-}
-
-NFSVolumeParamSet::NFSVolumeParamSet() { SetDescription("Set the volume parameters of the NAS volumes."); }
-
-NFSVolumeParamSet::~NFSVolumeParamSet() = default;
-
-std::shared_ptr<InputSpec> NFSVolumeParamSet::GetInputSpecInternal()
-{
-    const V3ParamFeatures features;
-    auto inputs = VolumeNameInputSpec("The NAS volume name.");
-    AddMaxQueueDepthParameter(inputs, "The maximum queue depth for the NAS volume.");
-    if (features.knxnic) {
-        AddParameter(inputs,
-                     {kKnxnic, "I", ParameterType::String, "The new knxnic to be configured for the NAS volume."});
-    }
-    if (features.connections) {
-        AddParameter(inputs, {kConnections, "c", ParameterType::Int,
-                            "The number of RPC connections to be established for the NFS datastore. A higher number "
-                            "of connections yields better performance on datastores with higher IO load.",
-                            false, IntRange(1, 8)});
-    }
-    return inputs;
-}
-
-std::shared_ptr<OutputSpec> NFSVolumeParamSet::GetOutputSpecInternal() { return BooleanOutputSpec(); }
-
-void NFSVolumeParamSet::ExecuteInternal(const InputPtr& in, const OutputPtr& out)
-{
-    const V3ParamFeatures features;
-    // The knxnic parameter exists only while its feature switch is on.
-    const std::string knxnic = features.knxnic ? in->GetParameter(kKnxnic) : std::string();
-    const bool setKnxnic = IsGiven(knxnic);
-    const bool setConnections = features.connections && in->HasParameter(kConnections);
-    SetVolumeParams(in->GetParameter(kOptionVolumeName), NonPEV3Volumes, "NAS", out,
-                    [&](NetworkFileSystem& volume) {
-                        ApplyMaxQueueDepth(in, volume);
-                        if (setKnxnic) {
-                            volume.SetKnxnics(knxnic);
-                        }
-                        if (setConnections) {
-                            volume.SetConnectionsParam(static_cast<std::int32_t>(in->GetParameterInt(kConnections)));
-                        }
-                    });
-}
-
-// ---- storage nfs41 param get ----
-
-std::shared_ptr<NFS41VolumeParamGet> NFS41VolumeParamGet::New()
-{
-    return std::shared_ptr<NFS41VolumeParamGet>(new NFS41VolumeParamGet());
-}
-
-NFS41VolumeParamGet::NFS41VolumeParamGet()
-{
-    SetDescription("Get the volume parameters of the NFS v4.1 volumes.");
-    SetDefaultOutputFormatter("table");
-    std::string fields = kBaseParamFields;
-    if (IsFeatureEnabled(Feature::Nfs41KnxnicBinding)) {
-        fields += ", Knxnics";
-    }
-    SetDefaultOutputParameter("fields:NasMountParams", fields);
-}
-
-NFS41VolumeParamGet::~NFS41VolumeParamGet() = default;
-
-std::shared_ptr<InputSpec> NFS41VolumeParamGet::GetInputSpecInternal()
-{
-    return VolumeNameInputSpec("NFS v4.1 volume name(\"all\" to list all).");
-}
-
-std::shared_ptr<OutputSpec> NFS41VolumeParamGet::GetOutputSpecInternal()
-{
-    return ListOutputSpec(GetOutputStructure());
-}
-
-std::shared_ptr<MetaStruct> NFS41VolumeParamGet::GetOutputStructure()
-{
-    return MakeV41ParamRow(IsFeatureEnabled(Feature::Nfs41KnxnicBinding));
-}
-
-void NFS41VolumeParamGet::ExecuteInternal(const InputPtr& in, const OutputPtr& out)
-{
-    const bool knxnics = IsFeatureEnabled(Feature::Nfs41KnxnicBinding);
-    ListVolumeParams(
-        in->GetParameter(kOptionVolumeName), NonPEV41Volumes, out,
-        [&] { return MakeV41ParamRow(knxnics); },
-        [&](NetworkFileSystem& volume, MetaStruct& row) {
-            if (knxnics) {
-                row.SetField("Knxnics", volume.GetKnxnics());
-            }
-        });
-}
-
-// ---- storage nfs41 param set ----
-
-std::shared_ptr<NFS41VolumeParamSet> NFS41VolumeParamSet::New()
-{
-    return std::shared_ptr<NFS41VolumeParamSet>(new NFS41VolumeParamSet());
-}
-
-NFS41VolumeParamSet::NFS41VolumeParamSet() { SetDescription("Set the volume parameters of the NFS v4.1 volumes."); }
-
-NFS41VolumeParamSet::~NFS41VolumeParamSet() = default;
-
-std::shared_ptr<InputSpec> NFS41VolumeParamSet::GetInputSpecInternal()
-{
-    auto inputs = VolumeNameInputSpec("The NFS v4.1 volume name.");
-    AddMaxQueueDepthParameter(inputs, "The maximum queue depth for the NFS v4.1 volume.");
-    if (IsFeatureEnabled(Feature::Nfs41KnxnicBinding)) {
-        AddParameter(inputs, {kHostKnxnic, "I", ParameterType::StringList,
-                            "The hostname or IP address followed by a colon(:) and knxnic name. This parameter can be "
-                            "specified more than once. E.g.: --host-knxnic=host1:knxnic1 --host-knxnic=ip2:knxnic2"});
-    }
-    return inputs;
-}
-
-std::shared_ptr<OutputSpec> NFS41VolumeParamSet::GetOutputSpecInternal() { return BooleanOutputSpec(); }
-
-void NFS41VolumeParamSet::ExecuteInternal(const InputPtr& in, const OutputPtr& out)
-{
-    std::vector<std::string> hostKnxnics;
-    if (IsFeatureEnabled(Feature::Nfs41KnxnicBinding)) {
-        in->GetParameterList(kHostKnxnic, hostKnxnics);
-    }
-    const std::string knxnics = JoinWithCommas(hostKnxnics);
-    SetVolumeParams(in->GetParameter(kOptionVolumeName), NonPEV41Volumes, "NFS v4.1", out,
-                    [&](NetworkFileSystem& volume) {
-                        ApplyMaxQueueDepth(in, volume);
-                        if (!hostKnxnics.empty()) {
-                            volume.SetKnxnics(knxnics);
-                        }
-                    });
-}
+NodePtr NewNFSVolumeParamGet() { return New<NfsParamGet<HostCtl::Storage::NFS_VERSION_3>>(kV3GetDecl); }
+NodePtr NewNFSVolumeParamSet() { return New<NFSVolumeParamSet>(kNFSVolumeParamSetDecl); }
+NodePtr NewNFS41VolumeParamGet() { return New<NfsParamGet<HostCtl::Storage::NFS_VERSION_41>>(kV41GetDecl); }
+NodePtr NewNFS41VolumeParamSet() { return New<NFS41VolumeParamSet>(kNFS41VolumeParamSetDecl); }
 
 } // namespace OrvaneCli::FileSystem

@@ -1,77 +1,61 @@
-#include "nfs/NFSVolumePreunmount.h"
-
 #include <string>
+
+#include "command/StorageCommand.h"
+#include "nfs/Manifest.h"
 
 namespace OrvaneCli::FileSystem {
 
 namespace {
 
-using PreunmountOperation = void (StorageInfoImpl::*)(const std::string&);
+enum class Transition { Enter, Exit };
 
-std::shared_ptr<InputSpec> PreunmountInputSpec(const char* volumeNameDescription)
-{
-    auto inputs = InputSpec::New();
-    AddParameter(inputs, {kOptionVolumeName, "v", ParameterType::String, volumeNameDescription, true});
-    return inputs;
-}
+// storage nfs preunmountstate enter / exit: moves the named volume into or out of the
+// preunmount state. Unlike other commands, the host's message never stands alone: it is
+// prefixed with what failed and the volume's name.
+template <Transition kTransition>
+class NfsPreunmountState final : public StorageCommand {
+    using StorageCommand::StorageCommand;
 
-// Runs `operation` on the named volume. Unlike other commands, the host's message never
-// stands alone: it is prefixed with `failurePrefix` and the volume name.
-void ChangePreunmountState(const InputPtr& in, const OutputPtr& out, PreunmountOperation operation,
-                           const char* failurePrefix)
-{
-    StorageInfoImpl storage;
-    const std::string& volumeName = in->GetParameter(kOptionVolumeName);
-    try {
-        (storage.*operation)(volumeName);
-        out->SetRootObject(MetaBool::New(true));
-    } catch (const HostCtlException& e) {
-        out->AddErrorMessage(HostCtl::Misc::StrCat(failurePrefix, volumeName, ": ", e.message));
+    void Run(const InputPtr& in, const OutputPtr& out) override
+    {
+        constexpr bool kEnter = kTransition == Transition::Enter;
+        // A failure to reach the storage information is not this command's to report.
+        WithStorageInfo(StorageInfoPlacement::Unguarded, out, [&](StorageInfoImpl& storage) {
+            const std::string& volumeName = in->GetParameter(kOptionVolumeName);
+            try {
+                if (kEnter) {
+                    storage.EnterNetworkFileSystemPreUnmount(volumeName);
+                } else {
+                    storage.ExitNetworkFileSystemPreUnmount(volumeName);
+                }
+                out->SetRootObject(MetaBool::New(true));
+            } catch (const HostCtlException& e) {
+                out->AddErrorMessage(
+                    HostCtl::Misc::StrCat(kEnter ? "Preunmount Enter failed for " : "Preunmount Exit failed for ",
+                                          volumeName, ": ", e.message));
+            }
+        });
     }
+};
+
+CommandDecl PreunmountDecl(const char* description, const char* volumeName)
+{
+    return {.description = description,
+            .parameters = {{kOptionVolumeName, "v", ParameterType::String, volumeName, true}}};
 }
 
 } // namespace
 
-std::shared_ptr<NFSVolumePreunmountEnter> NFSVolumePreunmountEnter::New()
+NodePtr NewNFSVolumePreunmountEnter()
 {
-    return std::make_shared<NFSVolumePreunmountEnter>();
+    return New<NfsPreunmountState<Transition::Enter>>(
+        PreunmountDecl("Enter NAS volume to preunmount state.", "Name of the NAS volume to enter preunmount state."));
 }
 
-NFSVolumePreunmountEnter::NFSVolumePreunmountEnter() { SetDescription("Enter NAS volume to preunmount state."); }
-
-NFSVolumePreunmountEnter::~NFSVolumePreunmountEnter() = default;
-
-std::shared_ptr<InputSpec> NFSVolumePreunmountEnter::GetInputSpecInternal()
+NodePtr NewNFSVolumePreunmountExit()
 {
-    return PreunmountInputSpec("Name of the NAS volume to enter preunmount state.");
-}
-
-std::shared_ptr<OutputSpec> NFSVolumePreunmountEnter::GetOutputSpecInternal() { return BooleanOutputSpec(); }
-
-void NFSVolumePreunmountEnter::ExecuteInternal(const InputPtr& in, const OutputPtr& out)
-{
-    ChangePreunmountState(in, out, &StorageInfoImpl::EnterNetworkFileSystemPreUnmount, "Preunmount Enter failed for ");
-}
-
-std::shared_ptr<NFSVolumePreunmountExit> NFSVolumePreunmountExit::New()
-{
-    return std::make_shared<NFSVolumePreunmountExit>();
-}
-
-NFSVolumePreunmountExit::NFSVolumePreunmountExit() { SetDescription("Exit NAS volume from preunmount state."); }
-
-NFSVolumePreunmountExit::~NFSVolumePreunmountExit() = default;
-
-std::shared_ptr<InputSpec> NFSVolumePreunmountExit::GetInputSpecInternal()
-{
-    return PreunmountInputSpec("Name of the NAS volume to exit from preunmount state.");
-}
-
-std::shared_ptr<OutputSpec> NFSVolumePreunmountExit::GetOutputSpecInternal() { return BooleanOutputSpec(); }
-
-void NFSVolumePreunmountExit::ExecuteInternal(const InputPtr& in, const OutputPtr& out)
-{
-    ChangePreunmountState(in, out, &StorageInfoImpl::ExitNetworkFileSystemPreUnmount, "Preunmount Exit failed for ");
+    return New<NfsPreunmountState<Transition::Exit>>(PreunmountDecl(
+        "Exit NAS volume from preunmount state.", "Name of the NAS volume to exit from preunmount state."));
 }
 
 } // namespace OrvaneCli::FileSystem

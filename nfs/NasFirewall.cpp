@@ -1,48 +1,26 @@
-#include "nfs/NasFirewall.h"
-
 #include <string>
 #include <vector>
 
-#include "nfs/NFSVolumeList.h"
+#include "command/StorageCommand.h"
+#include "nfs/Manifest.h"
 
 namespace OrvaneCli::FileSystem {
 
+namespace {
+
 using HostCtl::Storage::NfsVersion;
 
-struct NfsClientRuleset {
-    static constexpr NfsVersion version = HostCtl::Storage::NFS_VERSION_3;
-    static constexpr const char* addDescription = "Add a new allowed IP/Mask entry in the nfsClient firewall ruleset";
-    static constexpr const char* addParameter = "The IP/Mask to be added in the nfsClient firewall ruleset";
-    static constexpr const char* removeDescription =
-        "Remove an existing IP/Mask entry from the nfsClient firewall ruleset";
-    static constexpr const char* removeParameter =
-        "IP/Mask entry that has to be removed from nfsClient firewall ruleset.";
-    static constexpr const char* listDescription =
-        "List the allowed IP/Mask entries from the nfsClient firewall ruleset.";
-};
-
-struct Nfs41ClientRuleset {
-    static constexpr NfsVersion version = HostCtl::Storage::NFS_VERSION_41;
-    static constexpr const char* addDescription = "Add a new allowed IP/Mask entry in the nfs41Client firewall ruleset";
-    static constexpr const char* addParameter = "The IP/Mask to be added in the nfs41Client firewall ruleset";
-    static constexpr const char* removeDescription =
-        "Remove an existing IP/Mask entry from the nfs41Client firewall ruleset";
-    static constexpr const char* removeParameter =
-        "IP/Mask entry that has to be removed from nfs41Client firewall ruleset.";
-    static constexpr const char* listDescription =
-        "List the allowed IP/Mask entries from the nfs41Client firewall ruleset.";
-};
-
-namespace {
+// The NFS client firewall rule sets differ only in their names and the version they pass to
+// the host, so each command is written once over the version.
+std::string Ruleset(NfsVersion version)
+{
+    return version == HostCtl::Storage::NFS_VERSION_41 ? "nfs41Client" : "nfsClient";
+}
 
 constexpr const char* kIpMask = "ip-mask";
 
-std::shared_ptr<InputSpec> IpMaskInputSpec(const char* description)
-{
-    auto inputs = InputSpec::New();
-    AddParameter(inputs, {kIpMask, "F", ParameterType::String, description, true});
-    return inputs;
-}
+enum Field { kAllowedIpMask };
+const ColumnTable kColumns("NasFirewallConfigs", {{kAllowedIpMask, "Allowed IPMask"}}, false);
 
 // Only entries with a mask may be added: IPv4 with /0-32 (1) or IPv6 with /0-128 (3).
 bool IsIpMask(const std::string& text)
@@ -51,151 +29,79 @@ bool IsIpMask(const std::string& text)
     return type == 1 || type == 3;
 }
 
+enum class Change { Add, Remove };
+
+// storage nfs firewall add / remove, storage nfs41 firewall add / remove: one IP/Mask entry
+// handed to the host. Only add checks the text first; remove passes any text on, the host
+// decides what it can remove.
+template <NfsVersion kVersion, Change kChange>
+class NasFirewallChange final : public StorageCommand {
+public:
+    NasFirewallChange()
+        : StorageCommand(
+              {.description =
+                   kAdd ? "Add a new allowed IP/Mask entry in the " + Ruleset(kVersion) + " firewall ruleset"
+                        : "Remove an existing IP/Mask entry from the " + Ruleset(kVersion) + " firewall ruleset",
+               .parameters = {
+                   {kIpMask, "F", ParameterType::String,
+                    kAdd ? "The IP/Mask to be added in the " + Ruleset(kVersion) + " firewall ruleset"
+                         : "IP/Mask entry that has to be removed from " + Ruleset(kVersion) + " firewall ruleset.",
+                    true}}})
+    {
+    }
+
+private:
+    static constexpr bool kAdd = kChange == Change::Add;
+
+    void Run(const InputPtr& in, const OutputPtr& out) override
+    {
+        const std::string& ipMask = in->GetParameter(kIpMask);
+        if (kAdd && !IsIpMask(ipMask)) {
+            out->AddErrorMessage("Only IP/Mask entries are allowed to be added");
+            return;
+        }
+        WithStorageInfo(StorageInfoPlacement::InsideGuard, out, [&](StorageInfoImpl& storage) {
+            if (kAdd) {
+                storage.AddNasFirewallConfig(ipMask, kVersion);
+            } else {
+                storage.RemoveNasFirewallConfig(ipMask, kVersion);
+            }
+            out->SetRootObject(MetaBool::New(true));
+        });
+    }
+};
+
+// storage nfs firewall list, storage nfs41 firewall list
+template <NfsVersion kVersion>
+class NasFirewallList final : public StorageCommand {
+public:
+    NasFirewallList()
+        : StorageCommand(
+              {.description = "List the allowed IP/Mask entries from the " + Ruleset(kVersion) + " firewall ruleset.",
+               .result = One(kColumns),
+               .formatter = "simple"})
+    {
+    }
+
+private:
+    void Run(const InputPtr&, const OutputPtr& out) override
+    {
+        WithStorageInfo(StorageInfoPlacement::InsideGuard, out, [&](StorageInfoImpl& storage) {
+            const RowShape shape = Rows();
+            auto result = shape.NewRow();
+            result.Set(kAllowedIpMask, JoinWithCommas(storage.GetNasFirewallConfigs(kVersion)));
+            out->SetRootObject(result.Structure());
+        });
+    }
+};
+
 } // namespace
 
-// ---- add ----
-
-template <typename Ruleset>
-NasFirewallAddCommand<Ruleset>::NasFirewallAddCommand()
-{
-    SetDescription(Ruleset::addDescription);
-}
-
-template <typename Ruleset>
-NasFirewallAddCommand<Ruleset>::~NasFirewallAddCommand() = default;
-
-template <typename Ruleset>
-std::shared_ptr<InputSpec> NasFirewallAddCommand<Ruleset>::GetInputSpecInternal()
-{
-    return IpMaskInputSpec(Ruleset::addParameter);
-}
-
-template <typename Ruleset>
-std::shared_ptr<OutputSpec> NasFirewallAddCommand<Ruleset>::GetOutputSpecInternal()
-{
-    return BooleanOutputSpec();
-}
-
-template <typename Ruleset>
-void NasFirewallAddCommand<Ruleset>::ExecuteInternal(const InputPtr& in, const OutputPtr& out)
-{
-    const std::string& ipMask = in->GetParameter(kIpMask);
-    if (!IsIpMask(ipMask)) {
-        out->AddErrorMessage("Only IP/Mask entries are allowed to be added");
-        return;
-    }
-    WithStorageInfo(StorageInfoPlacement::InsideGuard, out, [&](StorageInfoImpl& storage) {
-        storage.AddNasFirewallConfig(ipMask, Ruleset::version);
-        out->SetRootObject(MetaBool::New(true));
-    });
-}
-
-// ---- remove ----
-
-template <typename Ruleset>
-NasFirewallRemoveCommand<Ruleset>::NasFirewallRemoveCommand()
-{
-    SetDescription(Ruleset::removeDescription);
-}
-
-template <typename Ruleset>
-NasFirewallRemoveCommand<Ruleset>::~NasFirewallRemoveCommand() = default;
-
-template <typename Ruleset>
-std::shared_ptr<InputSpec> NasFirewallRemoveCommand<Ruleset>::GetInputSpecInternal()
-{
-    return IpMaskInputSpec(Ruleset::removeParameter);
-}
-
-template <typename Ruleset>
-std::shared_ptr<OutputSpec> NasFirewallRemoveCommand<Ruleset>::GetOutputSpecInternal()
-{
-    return BooleanOutputSpec();
-}
-
-// Any text is passed on: the host decides what it can remove.
-template <typename Ruleset>
-void NasFirewallRemoveCommand<Ruleset>::ExecuteInternal(const InputPtr& in, const OutputPtr& out)
-{
-    const std::string& ipMask = in->GetParameter(kIpMask);
-    WithStorageInfo(StorageInfoPlacement::InsideGuard, out, [&](StorageInfoImpl& storage) {
-        storage.RemoveNasFirewallConfig(ipMask, Ruleset::version);
-        out->SetRootObject(MetaBool::New(true));
-    });
-}
-
-// ---- list ----
-
-template <typename Ruleset>
-NasFirewallListCommand<Ruleset>::NasFirewallListCommand()
-{
-    SetDescription(Ruleset::listDescription);
-    SetDefaultOutputFormatter("simple");
-}
-
-template <typename Ruleset>
-NasFirewallListCommand<Ruleset>::~NasFirewallListCommand() = default;
-
-template <typename Ruleset>
-std::shared_ptr<InputSpec> NasFirewallListCommand<Ruleset>::GetInputSpecInternal()
-{
-    return InputSpec::New();
-}
-
-template <typename Ruleset>
-std::shared_ptr<OutputSpec> NasFirewallListCommand<Ruleset>::GetOutputSpecInternal()
-{
-    return StructOutputSpec(GetOutputStructure());
-}
-
-template <typename Ruleset>
-std::shared_ptr<MetaStruct> NasFirewallListCommand<Ruleset>::GetOutputStructure()
-{
-    return MakeStructure("NasFirewallConfigs", {{"Allowed IPMask", FieldKind::String}});
-}
-
-template <typename Ruleset>
-void NasFirewallListCommand<Ruleset>::ExecuteInternal(const InputPtr&, const OutputPtr& out)
-{
-    WithStorageInfo(StorageInfoPlacement::InsideGuard, out, [&](StorageInfoImpl& storage) {
-        auto result = GetOutputStructure();
-        result->SetField("Allowed IPMask", JoinWithCommas(storage.GetNasFirewallConfigs(Ruleset::version)));
-        out->SetRootObject(result);
-    });
-}
-
-template class NasFirewallAddCommand<NfsClientRuleset>;
-template class NasFirewallRemoveCommand<NfsClientRuleset>;
-template class NasFirewallListCommand<NfsClientRuleset>;
-template class NasFirewallAddCommand<Nfs41ClientRuleset>;
-template class NasFirewallRemoveCommand<Nfs41ClientRuleset>;
-template class NasFirewallListCommand<Nfs41ClientRuleset>;
-
-std::shared_ptr<NFSFirewallAdd> NFSFirewallAdd::New() { return std::shared_ptr<NFSFirewallAdd>(new NFSFirewallAdd()); }
-
-std::shared_ptr<NFSFirewallRemove> NFSFirewallRemove::New()
-{
-    return std::shared_ptr<NFSFirewallRemove>(new NFSFirewallRemove());
-}
-
-std::shared_ptr<NFSFirewallList> NFSFirewallList::New()
-{
-    return std::shared_ptr<NFSFirewallList>(new NFSFirewallList());
-}
-
-std::shared_ptr<NFS41FirewallAdd> NFS41FirewallAdd::New()
-{
-    return std::shared_ptr<NFS41FirewallAdd>(new NFS41FirewallAdd());
-}
-
-std::shared_ptr<NFS41FirewallRemove> NFS41FirewallRemove::New()
-{
-    return std::shared_ptr<NFS41FirewallRemove>(new NFS41FirewallRemove());
-}
-
-std::shared_ptr<NFS41FirewallList> NFS41FirewallList::New()
-{
-    return std::shared_ptr<NFS41FirewallList>(new NFS41FirewallList());
-}
+NodePtr NewNFSFirewallAdd() { return New<NasFirewallChange<HostCtl::Storage::NFS_VERSION_3, Change::Add>>(); }
+NodePtr NewNFSFirewallRemove() { return New<NasFirewallChange<HostCtl::Storage::NFS_VERSION_3, Change::Remove>>(); }
+NodePtr NewNFSFirewallList() { return New<NasFirewallList<HostCtl::Storage::NFS_VERSION_3>>(); }
+NodePtr NewNFS41FirewallAdd() { return New<NasFirewallChange<HostCtl::Storage::NFS_VERSION_41, Change::Add>>(); }
+NodePtr NewNFS41FirewallRemove() { return New<NasFirewallChange<HostCtl::Storage::NFS_VERSION_41, Change::Remove>>(); }
+NodePtr NewNFS41FirewallList() { return New<NasFirewallList<HostCtl::Storage::NFS_VERSION_41>>(); }
 
 } // namespace OrvaneCli::FileSystem

@@ -14,7 +14,6 @@ namespace NfsAddArg {
 inline constexpr const char* kShare = "share";
 inline constexpr const char* kReadOnly = "readonly";
 inline constexpr const char* kIsPE = "ispe";
-inline constexpr const char* kHostKnxnic = "host-knxnic";
 } // namespace NfsAddArg
 
 // Mount flags word of NetworkFileSystem::Mount.

@@ -11,6 +11,7 @@ extern "C" {
 STORAGECLI_EXPORT void AutoCli_RegisterNamespaces(std::shared_ptr<Quillets::AutoCli::NamespaceNode> root);
 STORAGECLI_EXPORT void Core_RegisterInternalNamespaces(std::shared_ptr<Quillets::AutoCli::NamespaceNode> root);
 STORAGECLI_EXPORT void Nmp_RegisterInternalNamespaces(std::shared_ptr<Quillets::AutoCli::NamespaceNode> parent);
-STORAGECLI_EXPORT void ClusteredHdsk_RegisterInternalNamespace(std::shared_ptr<Quillets::AutoCli::NamespaceNode> parent);
+STORAGECLI_EXPORT void ClusteredHdsk_RegisterInternalNamespace(
+    std::shared_ptr<Quillets::AutoCli::NamespaceNode> parent);
 STORAGECLI_EXPORT void FilesystemNfs_RegisterNamespaces(std::shared_ptr<Quillets::AutoCli::NamespaceNode> parent);
 }

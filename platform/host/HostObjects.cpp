@@ -609,6 +609,10 @@ std::vector<std::unique_ptr<HostCtl::Storage::DiskLunPartition>> HlFileSystemImp
         std::vector<std::unique_ptr<HostCtl::Storage::DiskLunPartition>> result;
         const int count = static_cast<int>(r.Hlfs().extents.size());
         for (int i = 0; i < count; ++i) {
+            if (r.Hlfs().extents[static_cast<std::size_t>(i)].null) {
+                result.push_back(nullptr);
+                continue;
+            }
             auto extentHandle = std::make_shared<HostObjectHandle>(*handle_);
             extentHandle->extent = i;
             result.push_back(std::make_unique<HostSim::Objects::LunPartitionObject>(std::move(extentHandle)));

@@ -186,8 +186,12 @@ struct FsField {
 ojson WriteExtents(const std::vector<Extent>& extents)
 {
     ojson list = ojson::array();
-    for (const auto& e : extents)
-        list.push_back({{"deviceName", e.deviceName}, {"partition", e.partition}});
+    for (const auto& e : extents) {
+        if (e.null)
+            list.push_back(nullptr);
+        else
+            list.push_back({{"deviceName", e.deviceName}, {"partition", e.partition}});
+    }
     return list;
 }
 
@@ -234,6 +238,12 @@ const FsField kFsFields[] = {
          long i = 0;
          for (const auto& item : Array(v, w)) {
              Extent e;
+             if (item.is_null()) {
+                 e.null = true;
+                 extents.push_back(std::move(e));
+                 ++i;
+                 continue;
+             }
              EachKey(item, w[i++], [&](const std::string& key, const json& value, const Where& at) {
                  if (key == "deviceName")
                      e.deviceName = Str(value, at);

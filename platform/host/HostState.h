@@ -31,6 +31,7 @@ FsKind KindOfType(std::string_view type);
 struct Extent {
     std::string deviceName;
     std::uint8_t partition = 0;
+    bool null = false; // an entry the host hands out as an empty pointer
 };
 
 struct User {

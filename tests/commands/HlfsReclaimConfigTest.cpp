@@ -3,7 +3,8 @@
 
 #include <gtest/gtest.h>
 
-#include "hlfs/HLFSReclaimConfig.h"
+#include "RegisteredCommand.h"
+#include "command/Command.h"
 #include "support/Cli.h"
 #include "support/HostFixture.h"
 
@@ -16,7 +17,7 @@ TEST(HlfsReclaimConfigTest, UnknownMethodWritesNothing)
     in->SetParameter("volume-label", "ds-main");
     in->SetParameter("reclaim-method", "Fixed");
     in->SetParameterInt("reclaim-bandwidth", 1);
-    const auto result = TestSupport::Execute(*HLFSReclaimConfigSet::New(), in);
+    const auto result = TestSupport::Execute(*TestSupport::RegisteredCommand("storage hlfs reclaim config set"), in);
     EXPECT_EQ(result.errors, std::vector<std::string>{"Unsupported unmap method"});
     EXPECT_EQ(result.root, nullptr);
     EXPECT_TRUE(host.Journal().empty());

@@ -9,7 +9,8 @@
 #include <gtest/gtest.h>
 #include <nlohmann/json.hpp>
 
-#include "hlfs/HLFSSnapshotList.h"
+#include "RegisteredCommand.h"
+#include "command/Command.h"
 #include "support/Cli.h"
 #include "support/HostFixture.h"
 
@@ -75,9 +76,9 @@ json SelectionCopies()
 
 std::vector<std::string> ListedUuids(const std::string& label, const std::string& uuid)
 {
-    HLFSSnapshotList command;
+    auto command = TestSupport::RegisteredCommand("storage hlfs snapshot list");
     std::vector<std::string> uuids;
-    for (const auto& row : Rows(TestSupport::Execute(command, Args(label, uuid)))) {
+    for (const auto& row : Rows(TestSupport::Execute(*command, Args(label, uuid)))) {
         uuids.push_back(Str(row, "HLFS UUID"));
     }
     return uuids;
@@ -110,8 +111,8 @@ TEST(HlfsSnapshotTest, NameIsNotReadWhenTheUuidDiffers)
     const json faults = json::array(
         {{{"call", "UnresolvedHlfsVolumeImpl.GetVolumeName"}, {"target", "u-a"}, {"message", "name unreadable"}}});
     TestSupport::ScopedHost host(State(SelectionCopies(), faults));
-    HLFSSnapshotList command;
-    const auto result = TestSupport::Execute(command, Args("ds1", "u-c"));
+    auto command = TestSupport::RegisteredCommand("storage hlfs snapshot list");
+    const auto result = TestSupport::Execute(*command, Args("ds1", "u-c"));
     EXPECT_TRUE(result.errors.empty());
     ASSERT_EQ(Rows(result).size(), 1u);
 }
@@ -134,8 +135,8 @@ TEST(HlfsSnapshotTest, ReasonColumnsFollowTheirOwnCheck)
     for (const auto& c : cases) {
         SCOPED_TRACE(std::to_string(c.mountReason) + "/" + std::to_string(c.resignatureReason));
         TestSupport::ScopedHost host(State(json::array({Copy("ds1", "u-a", c.mountReason, c.resignatureReason)})));
-        HLFSSnapshotList command;
-        const auto rows = Rows(TestSupport::Execute(command, Args("", "")));
+        auto command = TestSupport::RegisteredCommand("storage hlfs snapshot list");
+        const auto rows = Rows(TestSupport::Execute(*command, Args("", "")));
         ASSERT_EQ(rows.size(), 1u);
         EXPECT_EQ(Bool(rows[0], "Can mount"), c.mountReason == 0);
         EXPECT_EQ(Str(rows[0], "Reason for un-mountability"), c.mountText);
@@ -148,8 +149,11 @@ TEST(HlfsSnapshotTest, ReasonColumnsFollowTheirOwnCheck)
 json MixedExtentCopy(const std::string& name, const std::string& uuid)
 {
     json copy = Copy(name, uuid);
-    copy["extents"] = json::array({{{"deviceName", uuid + "-0"}}, {{"deviceName", "other"}, {"impl", false}},
-                                   {{"deviceName", uuid + "-2"}}, nullptr, {{"deviceName", uuid + "-4"}}});
+    copy["extents"] = json::array({{{"deviceName", uuid + "-0"}},
+                                   {{"deviceName", "other"}, {"impl", false}},
+                                   {{"deviceName", uuid + "-2"}},
+                                   nullptr,
+                                   {{"deviceName", uuid + "-4"}}});
     return copy;
 }
 
@@ -165,17 +169,27 @@ TEST(HlfsSnapshotTest, HostFailuresKeepTheRowsGatheredSoFar)
     auto fault = [](const std::string& call, const std::string& target) {
         return json{{"call", call}, {"target", target}, {"message", "boom"}};
     };
-    const auto extentList = [] { return HLFSSnapshotExtentList::New(); };
-    const auto snapshotList = [] { return HLFSSnapshotList::New(); };
+    const auto extentList = [] { return TestSupport::RegisteredCommand("storage hlfs snapshot extent list"); };
+    const auto snapshotList = [] { return TestSupport::RegisteredCommand("storage hlfs snapshot list"); };
     const std::vector<Case> cases = {
         // One extent fails: the rest of that copy is skipped, the next copy is listed.
-        {"extent row", extentList, fault("DiskLunPartition.GetDeviceName", "u-b-2"), "",
+        {"extent row",
+         extentList,
+         fault("DiskLunPartition.GetDeviceName", "u-b-2"),
+         "",
          {"u-a-0", "u-a-2", "u-a-4", "u-b-0", "u-c-0", "u-c-2", "u-c-4"}},
-        {"volume in row", extentList, fault("UnresolvedHlfsVolumeImpl.GetLvmUuid", "u-b"), "",
+        {"volume in row",
+         extentList,
+         fault("UnresolvedHlfsVolumeImpl.GetLvmUuid", "u-b"),
+         "",
          {"u-a-0", "u-a-2", "u-a-4", "u-c-0", "u-c-2", "u-c-4"}},
         // A copy's extents cannot be listed: the walk ends.
         {"extents", extentList, fault("UnresolvedHlfsVolumeImpl.GetExtents", "u-b"), "", {"u-a-0", "u-a-2", "u-a-4"}},
-        {"selection", extentList, fault("UnresolvedHlfsVolumeImpl.GetVolumeName", "u-b"), "ds", {"u-a-0", "u-a-2", "u-a-4"}},
+        {"selection",
+         extentList,
+         fault("UnresolvedHlfsVolumeImpl.GetVolumeName", "u-b"),
+         "ds",
+         {"u-a-0", "u-a-2", "u-a-4"}},
         {"check", snapshotList, fault("UnresolvedHlfsVolumeImpl.CanResolve", "u-b"), "", {"u-a"}},
         {"count", snapshotList, fault("UnresolvedHlfsVolumeImpl.GetExtents", "u-c"), "", {"u-a", "u-b"}},
     };

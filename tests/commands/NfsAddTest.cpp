@@ -8,8 +8,8 @@
 #include <gtest/gtest.h>
 #include <nlohmann/json.hpp>
 
-#include "nfs/NFS41VolumeAdd.h"
-#include "nfs/NFSVolumeAdd.h"
+#include "RegisteredCommand.h"
+#include "command/Command.h"
 #include "support/Cli.h"
 #include "support/HostFixture.h"
 
@@ -89,7 +89,7 @@ TEST(NfsAddTest, V3ArgumentsReachTheHostAsDecided)
     for (const auto& c : cases) {
         SCOPED_TRACE(std::string(c.features) + " " + c.words);
         TestSupport::ScopedHost host(State(c.features, R"(["srv", "fe80::1", ""])"));
-        const auto result = TestSupport::Execute(*NFSVolumeAdd::New(),
+        const auto result = TestSupport::Execute(*TestSupport::RegisteredCommand("storage nfs add"),
                                                  MakeInput(std::string("share=/exp volume-name=nas9 ") + c.words));
         if (c.error[0] != '\0') {
             EXPECT_EQ(result.errors, std::vector<std::string>{c.error});
@@ -118,7 +118,7 @@ TEST(NfsAddTest, V41ServerListAndSecurityReachTheHostAsDecided)
     for (const auto& c : cases) {
         SCOPED_TRACE(std::string(c.features) + " " + c.words);
         TestSupport::ScopedHost host(State(c.features));
-        const auto result = TestSupport::Execute(*NFS41VolumeAdd::New(),
+        const auto result = TestSupport::Execute(*TestSupport::RegisteredCommand("storage nfs41 add"),
                                                  MakeInput(std::string("share=/exp volume-name=nas9 ") + c.words));
         if (c.error[0] != '\0') {
             EXPECT_EQ(result.errors, std::vector<std::string>{c.error});
@@ -134,10 +134,12 @@ TEST(NfsAddTest, V41ServerListAndSecurityReachTheHostAsDecided)
 TEST(NfsAddTest, StorageInfoFailureIsAMessageOnlyForV41)
 {
     TestSupport::ScopedHost host(R"({"faults": [{"call": "StorageInfoImpl.new", "message": "no storage"}]})");
-    const auto v41 = TestSupport::Execute(*NFS41VolumeAdd::New(), MakeInput("hosts+=srv share=/exp volume-name=nas9"));
+    const auto v41 = TestSupport::Execute(*TestSupport::RegisteredCommand("storage nfs41 add"),
+                                          MakeInput("hosts+=srv share=/exp volume-name=nas9"));
     EXPECT_EQ(v41.errors, std::vector<std::string>{"no storage"});
     auto out = Output::New();
-    EXPECT_THROW(NFSVolumeAdd::New()->Execute(MakeInput("host=srv share=/exp volume-name=nas9"), out),
+    EXPECT_THROW(TestSupport::RegisteredCommand("storage nfs add")
+                     ->Execute(MakeInput("host=srv share=/exp volume-name=nas9"), out),
                  HostCtlException);
 }
 

@@ -8,8 +8,8 @@
 #include <gtest/gtest.h>
 #include <nlohmann/json.hpp>
 
-#include "nfs/NFSVolumeList.h"
-#include "nfs/NFSVolumeParam.h"
+#include "RegisteredCommand.h"
+#include "nfs/Manifest.h"
 #include "support/HostFixture.h"
 
 using namespace OrvaneCli::FileSystem;
@@ -17,10 +17,14 @@ using nlohmann::json;
 
 namespace {
 
-std::vector<std::string> Titles(const MetaStruct& structure)
+// The field titles of the rows of the command's declared result.
+std::vector<std::string> Titles(const std::string& path)
 {
+    auto list =
+        std::dynamic_pointer_cast<MetaList>(TestSupport::RegisteredCommand(path)->GetOutputSpec()->GetRootObject());
+    EXPECT_TRUE(list) << path;
     std::vector<std::string> titles;
-    for (const auto& [title, value] : structure.GetFields()) {
+    for (const auto& [title, value] : list->GetPrototype()->GetFields()) {
         titles.push_back(title);
     }
     return titles;
@@ -33,15 +37,13 @@ TEST(NfsListTest, TranslationsCoverEveryKnownValueAndFallBack)
         const char* security;
         const char* acceleration;
     } cases[] = {
-        {0, "none", "Unknown"}, {1, "sys", "Supported"}, {2, "krb5", "Not Supported"},
-        {3, "krb5i", "Unknown"}, {4, "krb5p", "Unknown"}, {7, "unknown", "Unknown"}, {-1, "unknown", "Unknown"},
+        {0, "none", "Unknown"},  {1, "sys", "Supported"},   {2, "krb5", "Not Supported"}, {3, "krb5i", "Unknown"},
+        {4, "krb5p", "Unknown"}, {7, "unknown", "Unknown"}, {-1, "unknown", "Unknown"},
     };
     for (const auto& c : cases) {
         SCOPED_TRACE(c.value);
-        EXPECT_EQ(NFS41VolumeList::TranslateSecurity(static_cast<NetworkFileSystem::SecurityType>(c.value)),
-                  c.security);
-        EXPECT_STREQ(NFS41VolumeList::TranslateQAXI(static_cast<HostCtl::Storage::QAXIState>(c.value)),
-                     c.acceleration);
+        EXPECT_EQ(TranslateSecurity(static_cast<NetworkFileSystem::SecurityType>(c.value)), c.security);
+        EXPECT_STREQ(TranslateQAXI(static_cast<HostCtl::Storage::QAXIState>(c.value)), c.acceleration);
     }
 }
 
@@ -52,14 +54,18 @@ TEST(NfsListTest, SwitchesChooseFieldsAndNeverLeakAcrossVersions)
         std::vector<std::string> v3List, v41List, v3Params, v41Params;
         const char* v3Hint;
     } cases[] = {
-        {false, false, false,
+        {false,
+         false,
+         false,
          {"Volume Name", "Host", "Share", "Accessible", "Mounted", "Read-Only", "isPE", "Hardware Acceleration"},
          {"Volume Name", "Host(s)", "Share", "Accessible", "Mounted", "Read-Only", "Security", "isPE",
           "Hardware Acceleration"},
          {"Volume Name", "MaxQueueDepth", "MaxReadTransferSize", "MaxWriteTransferSize"},
          {"Volume Name", "MaxQueueDepth", "MaxReadTransferSize", "MaxWriteTransferSize"},
          "Volume Name,Host,Share,Accessible,Mounted,Read-Only,isPE,Hardware Acceleration"},
-        {false, true, true,
+        {false,
+         true,
+         true,
          {"Volume Name", "Host", "Share", "Knxnic", "Connections", "Accessible", "Mounted", "Read-Only", "isPE",
           "Hardware Acceleration"},
          {"Volume Name", "Host(s)", "Share", "Accessible", "Mounted", "Read-Only", "Security", "isPE",
@@ -67,7 +73,9 @@ TEST(NfsListTest, SwitchesChooseFieldsAndNeverLeakAcrossVersions)
          {"Volume Name", "MaxQueueDepth", "MaxReadTransferSize", "MaxWriteTransferSize", "Knxnic", "Connections"},
          {"Volume Name", "MaxQueueDepth", "MaxReadTransferSize", "MaxWriteTransferSize"},
          "Volume Name,Host,Share,Knxnic,Accessible,Mounted,Connections,Read-Only,isPE,Hardware Acceleration"},
-        {true, true, false,
+        {true,
+         true,
+         false,
          {"Volume Name", "Host", "Share", "Connections", "Accessible", "Mounted", "Read-Only", "isPE",
           "Hardware Acceleration"},
          {"Volume Name", "Host(s)", "Share", "Knxnics", "Accessible", "Mounted", "Read-Only", "Security", "isPE",
@@ -75,7 +83,9 @@ TEST(NfsListTest, SwitchesChooseFieldsAndNeverLeakAcrossVersions)
          {"Volume Name", "MaxQueueDepth", "MaxReadTransferSize", "MaxWriteTransferSize", "Connections"},
          {"Volume Name", "MaxQueueDepth", "MaxReadTransferSize", "MaxWriteTransferSize", "Knxnics"},
          "Volume Name,Host,Share,Accessible,Mounted,Connections,Read-Only,isPE,Hardware Acceleration"},
-        {false, false, true,
+        {false,
+         false,
+         true,
          {"Volume Name", "Host", "Share", "Knxnic", "Accessible", "Mounted", "Read-Only", "isPE",
           "Hardware Acceleration"},
          {"Volume Name", "Host(s)", "Share", "Accessible", "Mounted", "Read-Only", "Security", "isPE",
@@ -87,11 +97,13 @@ TEST(NfsListTest, SwitchesChooseFieldsAndNeverLeakAcrossVersions)
     for (const auto& c : cases) {
         SCOPED_TRACE(::testing::Message() << "102=" << c.f102 << " 103=" << c.f103 << " 104=" << c.f104);
         TestSupport::ScopedHost host(json{{"features", {{"102", c.f102}, {"103", c.f103}, {"104", c.f104}}}}.dump());
-        EXPECT_EQ(Titles(*NFSVolumeList::New()->GetOutputStructure()), c.v3List);
-        EXPECT_EQ(Titles(*NFS41VolumeList::New()->GetOutputStructure()), c.v41List);
-        EXPECT_EQ(Titles(*NFSVolumeParamGet::New()->GetOutputStructure()), c.v3Params);
-        EXPECT_EQ(Titles(*NFS41VolumeParamGet::New()->GetOutputStructure()), c.v41Params);
-        EXPECT_EQ(NFSVolumeList::New()->GetDefaultOutputParameters().at("fields:NasMount"), c.v3Hint);
+        EXPECT_EQ(Titles("storage nfs list"), c.v3List);
+        EXPECT_EQ(Titles("storage nfs41 list"), c.v41List);
+        EXPECT_EQ(Titles("storage nfs param get"), c.v3Params);
+        EXPECT_EQ(Titles("storage nfs41 param get"), c.v41Params);
+        EXPECT_EQ(
+            TestSupport::RegisteredCommand("storage nfs list")->GetDefaultOutputParameters().at("fields:NasMount"),
+            c.v3Hint);
     }
 }
 

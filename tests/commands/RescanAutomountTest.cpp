@@ -7,7 +7,8 @@
 
 #include <gtest/gtest.h>
 
-#include "filesystem/VolumeRescan.h"
+#include "RegisteredCommand.h"
+#include "command/Command.h"
 #include "support/Cli.h"
 #include "support/HostFixture.h"
 
@@ -21,8 +22,9 @@ struct HostActionCommand {
 };
 
 const std::vector<HostActionCommand> kCommands = {
-    {"StorageInfoImpl.RescanHlfs", [] { return VolumeRescan::New(); }},
-    {"StorageInfoImpl.AutoFullMountVolumes", [] { return VolumeAutomount::New(); }},
+    {"StorageInfoImpl.RescanHlfs", [] { return TestSupport::RegisteredCommand("storage filesystem rescan"); }},
+    {"StorageInfoImpl.AutoFullMountVolumes",
+     [] { return TestSupport::RegisteredCommand("storage filesystem automount"); }},
 };
 
 std::string FaultState(const std::string& call, const std::string& message)
