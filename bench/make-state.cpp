@@ -59,9 +59,8 @@ ojson FileSystem(Random& r, std::size_t index, bool hlfsOnly)
     if (kind < 6) {
         std::snprintf(name, sizeof name, "datastore-%06zu", index);
         const int version = kind < 4 ? 6 : (kind == 4 ? 5 : 3);
-        fs = {{"type", "HLFS"},           {"volumeName", name},      {"uuid", Uuid(r)},
-              {"capacity", capacity},     {"used", used},            {"majorVersion", version},
-              {"lvmUuid", Uuid(r)},       {"lockMode", version == 6 ? 16 : 0}};
+        fs = {{"type", "HLFS"}, {"volumeName", name},      {"uuid", Uuid(r)},    {"capacity", capacity},
+              {"used", used},   {"majorVersion", version}, {"lvmUuid", Uuid(r)}, {"lockMode", version == 6 ? 16 : 0}};
         ojson extents = ojson::array();
         for (std::uint64_t e = 0, n = 1 + r.Below(2); e < n; ++e)
             extents.push_back({{"deviceName", "naa.6" + Hex(r.Next(), 16) + Hex(r.Next(), 15)}, {"partition", 1}});

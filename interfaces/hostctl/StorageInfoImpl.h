@@ -51,8 +51,7 @@ public:
                                                             const std::string& knxnic, std::uint32_t queueDepth,
                                                             std::int64_t connections);
     std::unique_ptr<NetworkFileSystem> AddV41NetworkFileSystem(const std::vector<std::string>& hosts,
-                                                               const std::string& share,
-                                                               const std::string& volumeName,
+                                                               const std::string& share, const std::string& volumeName,
                                                                NetworkFileSystem::SecurityType security,
                                                                bool knxnicBound);
     void RemoveNetworkFileSystem(const std::string& volumeName);

@@ -35,7 +35,10 @@ std::shared_ptr<ParameterSpec> ParameterSpec::New(const std::string& name, Param
 void ParameterSpec::SetShortName(const std::string& shortName) { shortName_ = shortName; }
 void ParameterSpec::SetDescription(const std::string& description) { description_ = description; }
 void ParameterSpec::SetRequired(bool required) { required_ = required; }
-void ParameterSpec::SetConstraint(std::shared_ptr<ParameterConstraint> constraint) { constraint_ = std::move(constraint); }
+void ParameterSpec::SetConstraint(std::shared_ptr<ParameterConstraint> constraint)
+{
+    constraint_ = std::move(constraint);
+}
 
 std::shared_ptr<InputSpec> InputSpec::New() { return std::make_shared<InputSpec>(); }
 

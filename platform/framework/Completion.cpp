@@ -37,8 +37,8 @@ std::string WordArray(const std::vector<std::string>& words)
 
 // How an option's value completes, as the script's __autocli_value reports it.
 struct ValueRule {
-    std::string kind;                // none, any, file, choice or host
-    std::vector<std::string> words;  // the choices, or the host value kind
+    std::string kind;               // none, any, file, choice or host
+    std::vector<std::string> words; // the choices, or the host value kind
 };
 
 std::string ValueBranch(const std::vector<std::string>& patterns, const ValueRule& rule)
@@ -123,7 +123,7 @@ std::string TreeFunctions(const std::shared_ptr<NamespaceNode>& root, const Valu
         }
         ValueRule rule{"none", {}};
         if (!option.value.empty()) {
-            rule = option.fileValue ? ValueRule{"file", {}}
+            rule = option.fileValue         ? ValueRule{"file", {}}
                    : option.choices.empty() ? ValueRule{"any", {}}
                                             : ValueRule{"choice", option.choices};
         }
@@ -172,16 +172,20 @@ std::string WalkWords(const ShellWords& words)
            "            __autocli_value \"$cmdpath\" \"$word\"\n"
            "            [[ $__autocli_kind == none ]] && continue\n";
     if (splitsAtEquals) {
-        out += "            if ((i + 1 < " + last + ")) && [[ " + at("i + 1") + " == = ]]; then\n"
+        out += "            if ((i + 1 < " + last + ")) && [[ " + at("i + 1") +
+               " == = ]]; then\n"
                "                ((i++))\n"
                "            fi\n";
     }
-    out += "            if ((i + 1 >= " + last + ")); then\n"
+    out += "            if ((i + 1 >= " + last +
+           ")); then\n"
            "                opt=$word\n"
            "                break\n"
            "            fi\n"
            "            ((i++))\n"
-           "            __autocli_remember \"$word\" \"" + at("i") + "\"\n"
+           "            __autocli_remember \"$word\" \"" +
+           at("i") +
+           "\"\n"
            "            continue\n"
            "        fi\n"
            "        ((command || lost)) && continue\n"

@@ -266,12 +266,13 @@ std::string ManPage(const std::shared_ptr<AutoCli::NamespaceNode>& root)
         out += CommandSection(path, *command);
     });
     out += EntryList("ENVIRONMENT", std::begin(kEnvironment), std::end(kEnvironment), true);
-    out += Section("FILES") + Tagged(Bold("${XDG_STATE_HOME:-$HOME/.local/state}/autocli/host.json"),
-                                     "The default host state file, a JSON object. While it does not exist, "
-                                     "commands run on the demo host built into autocli, and the first change "
-                                     "writes it. A file named with --state or AUTOCLI_STATE must exist; "
-                                     "--init-state creates one from the demo host. --dump-state prints the "
-                                     "state in effect.") +
+    out += Section("FILES") +
+           Tagged(Bold("${XDG_STATE_HOME:-$HOME/.local/state}/autocli/host.json"),
+                  "The default host state file, a JSON object. While it does not exist, "
+                  "commands run on the demo host built into autocli, and the first change "
+                  "writes it. A file named with --state or AUTOCLI_STATE must exist; "
+                  "--init-state creates one from the demo host. --dump-state prints the "
+                  "state in effect.") +
            Tagged(Bold("FILE.lock"), "Beside the state file: held while a command runs, so that commands on one "
                                      "state run one after the other.");
     out += EntryList("EXIT STATUS", std::begin(kExitStatus), std::end(kExitStatus), false);

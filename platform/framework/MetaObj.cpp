@@ -177,7 +177,8 @@ MetaStruct::FieldRef MetaStruct::GetFieldRef(std::size_t index) const
 
 namespace {
 
-std::shared_ptr<MetaObject> ObjectOf(const std::variant<bool, std::int64_t, std::string, std::shared_ptr<MetaObject>>& value)
+std::shared_ptr<MetaObject> ObjectOf(
+    const std::variant<bool, std::int64_t, std::string, std::shared_ptr<MetaObject>>& value)
 {
     switch (value.index()) {
     case 0:

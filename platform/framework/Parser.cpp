@@ -124,7 +124,8 @@ std::string ApplyFormatParam(const std::string& text, GlobalOptions& globals, st
 }
 
 // The options every command line may carry. Those that choose the session or end the run
-// early (--state, --host, --version, --dump-state, --init-state, --list-commands, --completion) are taken only before the path.
+// early (--state, --host, --version, --dump-state, --init-state, --list-commands, --completion) are taken only before
+// the path.
 class GlobalReader {
 public:
     explicit GlobalReader(GlobalOptions& globals) : globals_(globals) {}
@@ -179,7 +180,8 @@ public:
             }
             const std::vector<std::string> shells{"bash", "zsh"};
             if (name == "--completion" && std::find(shells.begin(), shells.end(), value) == shells.end()) {
-                error = "Unknown shell " + Quote(value) + " for '--completion': use bash or zsh." + DidYouMean(value, shells);
+                error = "Unknown shell " + Quote(value) + " for '--completion': use bash or zsh." +
+                        DidYouMean(value, shells);
                 return Match::Failed;
             }
             slot = value;
@@ -249,10 +251,12 @@ public:
         if (arg.rfind("--", 0) == 0) {
             auto split = SplitLong(arg);
             const std::string& name = split.first;
-            parameter = Find([&](const ParameterSpec& p) { return !p.GetName().empty() && "--" + p.GetName() == name; });
+            parameter =
+                Find([&](const ParameterSpec& p) { return !p.GetName().empty() && "--" + p.GetName() == name; });
             inlineValue = std::move(split.second);
         } else {
-            parameter = Find([&](const ParameterSpec& p) { return !p.GetShortName().empty() && "-" + p.GetShortName() == arg; });
+            parameter = Find(
+                [&](const ParameterSpec& p) { return !p.GetShortName().empty() && "-" + p.GetShortName() == arg; });
         }
         if (parameter == nullptr) {
             return Match::NotMine;
@@ -328,8 +332,8 @@ private:
             }
             allowed.push_back(entry.first);
         }
-        return "Invalid value " + Quote(value) + " for '--" + parameter.GetName() +
-               "': must be one of " + Text::Join(allowed, ", ") + ".";
+        return "Invalid value " + Quote(value) + " for '--" + parameter.GetName() + "': must be one of " +
+               Text::Join(allowed, ", ") + ".";
     }
 
     std::string Apply(const ParameterSpec& parameter, const std::vector<std::string>& args, std::size_t& i,
@@ -544,7 +548,8 @@ Invocation ParseCommandLine(const std::shared_ptr<NamespaceNode>& root, const st
         }
         auto child = inv.node->GetNamespaceNode(arg);
         if (!child) {
-            const std::string where = inv.path.empty() ? std::string("at the top level") : "in '" + JoinPath(inv.path) + "'";
+            const std::string where =
+                inv.path.empty() ? std::string("at the top level") : "in '" + JoinPath(inv.path) + "'";
             return usage("Unknown namespace or command " + Quote(arg) + " " + where + "." +
                          DidYouMean(arg, ChildNames(*inv.node)));
         }

@@ -27,8 +27,8 @@ struct GlobalOptions {
     std::optional<std::string> completionShell; // --completion: "bash" or "zsh"
     std::optional<std::string> valueList;       // hidden --list-values KIND, for completion scripts
     bool manPage = false;                       // hidden --man-page, for the build
-    bool initState = false; // create the state file from the demo host and stop
-    bool dryRun = false;    // run on the state in memory, save nothing
+    bool initState = false;                     // create the state file from the demo host and stop
+    bool dryRun = false;                        // run on the state in memory, save nothing
 };
 
 // The global options that stand before the path, read on their own: enough to choose the
@@ -45,9 +45,9 @@ struct Invocation {
 
     Action action = Action::UsageError;
     GlobalOptions globals;
-    CommandPath path;                               // as far as it was resolved
-    std::shared_ptr<AutoCli::NamespaceNode> node;   // the node at `path`
-    std::shared_ptr<AutoCli::Command> command;      // for Run
+    CommandPath path;                             // as far as it was resolved
+    std::shared_ptr<AutoCli::NamespaceNode> node; // the node at `path`
+    std::shared_ptr<AutoCli::Command> command;    // for Run
     std::shared_ptr<CallSpec::OutputSpec> outputSpec;
     std::shared_ptr<CallSpec::Input> input;
     std::string error; // the one-line usage message for UsageError

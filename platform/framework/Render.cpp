@@ -168,7 +168,8 @@ const std::string* FindHint(const OutputHints& hints, const std::string& key)
 
 } // namespace
 
-std::shared_ptr<MetaStruct> RowShape(const std::shared_ptr<MetaObject>& result, const std::shared_ptr<MetaObject>& declared)
+std::shared_ptr<MetaStruct> RowShape(const std::shared_ptr<MetaObject>& result,
+                                     const std::shared_ptr<MetaObject>& declared)
 {
     if (auto shape = ShapeOfValue(declared)) {
         return shape;
@@ -186,8 +187,8 @@ std::string CheckFieldSelection(const std::shared_ptr<MetaObject>& declared, con
     std::vector<std::string> seen;
     for (const auto& title : fields) {
         if (std::find(known.begin(), known.end(), title) == known.end()) {
-            return "unknown field '" + Text::EscapeControl(title) + "'; the fields of " + shape->GetName() + " are: " +
-                   Text::Join(known, ", ") + "." + DidYouMean(title, known);
+            return "unknown field '" + Text::EscapeControl(title) + "'; the fields of " + shape->GetName() +
+                   " are: " + Text::Join(known, ", ") + "." + DidYouMean(title, known);
         }
         if (std::find(seen.begin(), seen.end(), title) != seen.end()) {
             return "field '" + Text::EscapeControl(title) + "' is chosen twice.";
@@ -196,7 +197,6 @@ std::string CheckFieldSelection(const std::shared_ptr<MetaObject>& declared, con
     }
     return {};
 }
-
 
 namespace {
 
@@ -511,10 +511,7 @@ Json CellJson(const CellText& cell)
     }
 }
 
-std::string DumpJson(const Json& value)
-{
-    return value.dump(2, ' ', false, nlohmann::json::error_handler_t::replace);
-}
+std::string DumpJson(const Json& value) { return value.dump(2, ' ', false, nlohmann::json::error_handler_t::replace); }
 
 void PrintJson(Printer& printer, const Layout& layout, const MetaObject& result)
 {
@@ -621,8 +618,7 @@ void PrintCsv(Printer& printer, const Layout& layout, bool showHeader)
 } // namespace
 
 void RenderResultTo(const TextSink& sink, const std::shared_ptr<MetaObject>& result,
-                    const std::shared_ptr<MetaObject>& declared, const OutputHints& hints,
-                    const OutputOptions& options)
+                    const std::shared_ptr<MetaObject>& declared, const OutputHints& hints, const OutputOptions& options)
 {
     const Formatter formatter = EffectiveFormatter(hints, options);
     const Layout layout = Describe(result, declared, hints, options, formatter);

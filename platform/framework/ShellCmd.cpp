@@ -22,10 +22,7 @@ std::function<void(const std::string&)> gShellSink;
 } // namespace
 
 namespace Quillets::Cli {
-void SetShellCommandSink(std::function<void(const std::string&)> sink)
-{
-    gShellSink = std::move(sink);
-}
+void SetShellCommandSink(std::function<void(const std::string&)> sink) { gShellSink = std::move(sink); }
 } // namespace Quillets::Cli
 
 namespace Quillets::AutoCli {
@@ -76,7 +73,11 @@ public:
     Fd(const Fd&) = delete;
     Fd& operator=(const Fd&) = delete;
     int Get() const { return fd_; }
-    void Reset(int fd) { Close(); fd_ = fd; }
+    void Reset(int fd)
+    {
+        Close();
+        fd_ = fd;
+    }
     void Close()
     {
         if (fd_ >= 0) {
@@ -172,8 +173,7 @@ int AutoCli_ShellCmd(const std::string& command, std::string& output, const std:
 
     const char* argv[] = {"sh", "-c", command.c_str(), nullptr};
     pid_t pid = -1;
-    const int spawned =
-        posix_spawn(&pid, "/bin/sh", &actions, &attributes, const_cast<char* const*>(argv), environ);
+    const int spawned = posix_spawn(&pid, "/bin/sh", &actions, &attributes, const_cast<char* const*>(argv), environ);
     posix_spawn_file_actions_destroy(&actions);
     posix_spawnattr_destroy(&attributes);
     inRead.Close();

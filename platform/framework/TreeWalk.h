@@ -18,13 +18,15 @@ struct CommandEntry {
 
 // Visits every command under `root`, depth first, children in registration order.
 // A node reached twice (shared or cyclic registration) is visited only the first time.
-void ForEachCommand(const std::shared_ptr<AutoCli::NamespaceNode>& root,
-                    const std::function<void(const CommandPath& path, const std::shared_ptr<AutoCli::Command>& command)>& visit);
+void ForEachCommand(
+    const std::shared_ptr<AutoCli::NamespaceNode>& root,
+    const std::function<void(const CommandPath& path, const std::shared_ptr<AutoCli::Command>& command)>& visit);
 
 // Visits every node under `root` (the root first, with an empty path), namespaces and commands
 // alike, in the same order and with the same rule for nodes reached twice.
-void ForEachNode(const std::shared_ptr<AutoCli::NamespaceNode>& root,
-                 const std::function<void(const CommandPath& path, const std::shared_ptr<AutoCli::NamespaceNode>& node)>& visit);
+void ForEachNode(
+    const std::shared_ptr<AutoCli::NamespaceNode>& root,
+    const std::function<void(const CommandPath& path, const std::shared_ptr<AutoCli::NamespaceNode>& node)>& visit);
 
 // Every command under `root` with its path, in the order ForEachCommand visits them.
 std::vector<CommandEntry> ListCommands(const std::shared_ptr<AutoCli::NamespaceNode>& root);

@@ -66,8 +66,8 @@ FileSystemRecord& AdoptCopy(UnresolvedVolume& copy, const std::string& uuid, con
     fs.type = HlFileSystem::HLFS_TYPE;
     fs.volumeName = name;
     fs.uuid = uuid;
-    for (FsKey key : {FsKey::type, FsKey::volumeName, FsKey::uuid, FsKey::capacity, FsKey::majorVersion,
-                      FsKey::extents, FsKey::mounted})
+    for (FsKey key : {FsKey::type, FsKey::volumeName, FsKey::uuid, FsKey::capacity, FsKey::majorVersion, FsKey::extents,
+                      FsKey::mounted})
         fs.Mark(key);
     auto& hlfs = fs.MutableHlfs();
     hlfs.lvmUuid = copy.lvmUuid;
@@ -276,8 +276,8 @@ void NetworkFileSystemObject::Mount(unsigned flags)
             return e.share == nfs.remoteShare && std::find(hosts.begin(), hosts.end(), e.host) != hosts.end();
         });
         if (found == exports.end())
-            Runtime::Throw("Unable to connect to NFS server " + (hosts.empty() ? std::string() : hosts.front()) +
-                           ":" + nfs.remoteShare);
+            Runtime::Throw("Unable to connect to NFS server " + (hosts.empty() ? std::string() : hosts.front()) + ":" +
+                           nfs.remoteShare);
         Set(r, r.mounted, true, FsKey::mounted);
         if (r.explicitlyUnmounted)
             Set(r, r.explicitlyUnmounted, false, FsKey::explicitlyUnmounted);
@@ -410,9 +410,8 @@ std::uint32_t NetworkFileSystemObject::GetMaxQueueDepth()
 void NetworkFileSystemObject::SetMaxQueueDepth(std::uint32_t depth, bool apply)
 {
     const J args = J::array({depth, apply});
-    OnFileSystem(handle(), "NetworkFileSystem.SetMaxQueueDepth", &args, [&](FileSystemRecord& r) {
-        Set(r, r.MutableNfs().maxQueueDepth, depth, FsKey::maxQueueDepth);
-    });
+    OnFileSystem(handle(), "NetworkFileSystem.SetMaxQueueDepth", &args,
+                 [&](FileSystemRecord& r) { Set(r, r.MutableNfs().maxQueueDepth, depth, FsKey::maxQueueDepth); });
 }
 
 NetworkFileSystem::SecurityType NetworkFileSystemObject::GetSecurityType()
@@ -457,7 +456,8 @@ std::string LunPartitionObject::GetDeviceName()
 
 std::uint8_t LunPartitionObject::GetPartition()
 {
-    return OnLunPartition(*handle_, "DiskLunPartition.GetPartition", [](const Model::Extent& e) { return e.partition; });
+    return OnLunPartition(*handle_, "DiskLunPartition.GetPartition",
+                          [](const Model::Extent& e) { return e.partition; });
 }
 
 ForeignUnresolvedVolume::~ForeignUnresolvedVolume() = default;
@@ -623,7 +623,8 @@ std::vector<std::unique_ptr<HostCtl::Storage::DiskLunPartition>> HlFileSystemImp
 
 std::string HlFileSystemImpl::GetLvmUuid()
 {
-    return OnFileSystem(*handle_, "HlFileSystem.GetLvmUuid", nullptr, [](FileSystemRecord& r) { return r.Hlfs().lvmUuid; });
+    return OnFileSystem(*handle_, "HlFileSystem.GetLvmUuid", nullptr,
+                        [](FileSystemRecord& r) { return r.Hlfs().lvmUuid; });
 }
 
 unsigned HlFileSystemImpl::GetLockMode()
@@ -688,8 +689,8 @@ HostCtl::Storage::HlfsVolumeUnmapProperty HlFileSystemImpl::GetUnmapProperty()
 
 void HlFileSystemImpl::SetUnmapProperty(const HostCtl::Storage::HlfsVolumeUnmapProperty& property)
 {
-    const J args = J::array({property.granularity, property.priority, property.bandwidth, property.reserved,
-                             property.method});
+    const J args =
+        J::array({property.granularity, property.priority, property.bandwidth, property.reserved, property.method});
     OnFileSystem(*handle_, "HlFileSystem.SetUnmapProperty", &args, [&](FileSystemRecord& r) {
         HostSim::Model::UnmapProperty next{property.granularity, property.priority, property.bandwidth,
                                            property.reserved, property.method};
@@ -778,23 +779,24 @@ std::string UnresolvedHlfsVolumeImpl::GetVolumeName()
 
 std::vector<std::unique_ptr<HostCtl::Storage::UnresolvedHlfsExtent>> UnresolvedHlfsVolumeImpl::GetExtents()
 {
-    return HostSim::Objects::OnUnresolved(*handle_, "UnresolvedHlfsVolumeImpl.GetExtents", nullptr,
-                                          [&](UnresolvedVolume& u) {
-        std::vector<std::unique_ptr<HostCtl::Storage::UnresolvedHlfsExtent>> result;
-        for (std::size_t i = 0; i < u.extents.size(); ++i) {
-            const auto& e = u.extents[i];
-            if (e.null) {
-                result.push_back(nullptr);
-                continue;
+    return HostSim::Objects::OnUnresolved(
+        *handle_, "UnresolvedHlfsVolumeImpl.GetExtents", nullptr, [&](UnresolvedVolume& u) {
+            std::vector<std::unique_ptr<HostCtl::Storage::UnresolvedHlfsExtent>> result;
+            for (std::size_t i = 0; i < u.extents.size(); ++i) {
+                const auto& e = u.extents[i];
+                if (e.null) {
+                    result.push_back(nullptr);
+                    continue;
+                }
+                auto extentHandle = HostSim::Objects::ExtentHandle(*handle_, static_cast<int>(i));
+                if (e.impl)
+                    result.push_back(std::make_unique<UnresolvedHlfsExtentImpl>(std::move(extentHandle)));
+                else
+                    result.push_back(
+                        std::make_unique<HostSim::Objects::ForeignUnresolvedExtent>(std::move(extentHandle)));
             }
-            auto extentHandle = HostSim::Objects::ExtentHandle(*handle_, static_cast<int>(i));
-            if (e.impl)
-                result.push_back(std::make_unique<UnresolvedHlfsExtentImpl>(std::move(extentHandle)));
-            else
-                result.push_back(std::make_unique<HostSim::Objects::ForeignUnresolvedExtent>(std::move(extentHandle)));
-        }
-        return result;
-    });
+            return result;
+        });
 }
 
 bool UnresolvedHlfsVolumeImpl::CanResolve(bool first, bool second, unsigned* reason)
@@ -802,43 +804,44 @@ bool UnresolvedHlfsVolumeImpl::CanResolve(bool first, bool second, unsigned* rea
     const J args = J::array({first, second});
     return HostSim::Objects::OnUnresolved(*handle_, "UnresolvedHlfsVolumeImpl.CanResolve", &args,
                                           [&](UnresolvedVolume& u) {
-        const unsigned code = second ? u.mountReason : u.resignatureReason;
-        if (reason)
-            *reason = code;
-        return code == 0;
-    });
+                                              const unsigned code = second ? u.mountReason : u.resignatureReason;
+                                              if (reason)
+                                                  *reason = code;
+                                              return code == 0;
+                                          });
 }
 
 std::unique_ptr<FileSystem> UnresolvedHlfsVolumeImpl::Mount(bool first, bool persistent)
 {
     const J args = J::array({first, persistent});
-    return HostSim::Objects::OnUnresolved(*handle_, "UnresolvedHlfsVolumeImpl.Mount", &args,
-                                          [&](UnresolvedVolume& u) -> std::unique_ptr<FileSystem> {
-        if (u.mountReason != 0)
-            Runtime::Throw("Cannot mount snapshot '" + u.volumeName + "': reason code " +
-                           std::to_string(u.mountReason));
-        const std::string uuid = u.uuid;
-        const std::string name = u.volumeName;
-        return HostSim::Objects::MakeFileSystem(HostSim::Objects::AdoptCopy(u, uuid, name));
-    });
+    return HostSim::Objects::OnUnresolved(
+        *handle_, "UnresolvedHlfsVolumeImpl.Mount", &args, [&](UnresolvedVolume& u) -> std::unique_ptr<FileSystem> {
+            if (u.mountReason != 0)
+                Runtime::Throw("Cannot mount snapshot '" + u.volumeName + "': reason code " +
+                               std::to_string(u.mountReason));
+            const std::string uuid = u.uuid;
+            const std::string name = u.volumeName;
+            return HostSim::Objects::MakeFileSystem(HostSim::Objects::AdoptCopy(u, uuid, name));
+        });
 }
 
 std::unique_ptr<FileSystem> UnresolvedHlfsVolumeImpl::Resignature()
 {
     const J args = J::array();
-    return HostSim::Objects::OnUnresolved(*handle_, "UnresolvedHlfsVolumeImpl.Resignature", &args,
-                                          [&](UnresolvedVolume& u) -> std::unique_ptr<FileSystem> {
-        if (u.resignatureReason != 0)
-            Runtime::Throw("Cannot resignature snapshot '" + u.volumeName + "': reason code " +
-                           std::to_string(u.resignatureReason));
-        // A new signature that no file system uses yet, the same for the same state every time.
-        std::string uuid;
-        for (int salt = 0; uuid.empty() || Runtime::FirstByUuid(uuid); ++salt)
-            uuid = HostSim::Model::UuidFromText("resignature/" + u.uuid + "/" + u.volumeName + "/" +
-                                                std::to_string(salt));
-        const std::string name = "snap-" + uuid.substr(0, 8) + "-" + u.volumeName;
-        return HostSim::Objects::MakeFileSystem(HostSim::Objects::AdoptCopy(u, uuid, name));
-    });
+    return HostSim::Objects::OnUnresolved(
+        *handle_, "UnresolvedHlfsVolumeImpl.Resignature", &args,
+        [&](UnresolvedVolume& u) -> std::unique_ptr<FileSystem> {
+            if (u.resignatureReason != 0)
+                Runtime::Throw("Cannot resignature snapshot '" + u.volumeName + "': reason code " +
+                               std::to_string(u.resignatureReason));
+            // A new signature that no file system uses yet, the same for the same state every time.
+            std::string uuid;
+            for (int salt = 0; uuid.empty() || Runtime::FirstByUuid(uuid); ++salt)
+                uuid = HostSim::Model::UuidFromText("resignature/" + u.uuid + "/" + u.volumeName + "/" +
+                                                    std::to_string(salt));
+            const std::string name = "snap-" + uuid.substr(0, 8) + "-" + u.volumeName;
+            return HostSim::Objects::MakeFileSystem(HostSim::Objects::AdoptCopy(u, uuid, name));
+        });
 }
 
 } // namespace KnxCtl::Storage

@@ -18,10 +18,10 @@
 
 namespace HostSim::Runtime {
 
+using HostCtl::Lib::HostCtlException;
 using Model::FileSystemRecord;
 using Model::State;
 using Model::UnresolvedVolume;
-using HostCtl::Lib::HostCtlException;
 
 [[noreturn]] void Throw(std::string message);
 

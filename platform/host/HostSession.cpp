@@ -78,10 +78,7 @@ Session gSession;
 std::function<void(const std::string&)> gJournalSink;
 bool gJournalWarned = false;
 
-std::string Errno(int error = errno)
-{
-    return std::strerror(error);
-}
+std::string Errno(int error = errno) { return std::strerror(error); }
 
 std::string DirectoryOf(const std::string& path)
 {
@@ -128,7 +125,7 @@ mode_t CurrentUmask()
 // mkdir -p for the state's folders; new folders are private to the user, as state folders are.
 void MakeDirectories(const std::string& dir)
 {
-    struct stat st{};
+    struct stat st {};
     if (::stat(dir.c_str(), &st) == 0) {
         if (!S_ISDIR(st.st_mode))
             throw std::runtime_error("'" + dir + "' is not a folder");
@@ -147,7 +144,7 @@ void MakeDirectories(const std::string& dir)
 struct Resolution {
     std::string target;
     bool exists = false;
-    struct stat st{};
+    struct stat st {};
 };
 
 Resolution Resolve(const std::string& path)
@@ -205,7 +202,8 @@ void IgnoreAlarm(int) {}
 // deadline. Returns 0 once locked, EWOULDBLOCK past the deadline, else the error.
 int WaitForLock(int fd, std::chrono::steady_clock::time_point deadline)
 {
-    struct sigaction quiet{}, oldAction{};
+    struct sigaction quiet {
+    }, oldAction{};
     quiet.sa_handler = IgnoreAlarm;
     sigemptyset(&quiet.sa_mask);
     quiet.sa_flags = 0; // no SA_RESTART: the alarm must end the wait
@@ -239,13 +237,12 @@ int WaitForLock(int fd, std::chrono::steady_clock::time_point deadline)
 // Takes the exclusive lock on `name` in `dirFd`, creating it with `mode`. The lock file is
 // never followed through a link and never left readable by others, so no other user can
 // hold it.
-int TakeLock(int dirFd, const std::string& name, mode_t mode, const std::string& statePath,
-             const std::string& lockPath)
+int TakeLock(int dirFd, const std::string& name, mode_t mode, const std::string& statePath, const std::string& lockPath)
 {
     const double timeout = LockTimeoutSeconds();
-    const auto deadline = std::chrono::steady_clock::now() +
-                          std::chrono::duration_cast<std::chrono::steady_clock::duration>(
-                              std::chrono::duration<double>(timeout));
+    const auto deadline =
+        std::chrono::steady_clock::now() +
+        std::chrono::duration_cast<std::chrono::steady_clock::duration>(std::chrono::duration<double>(timeout));
     for (;;) {
         Fd fd(::openat(dirFd, name.c_str(), O_RDONLY | O_CREAT | O_NOFOLLOW | O_CLOEXEC | O_NONBLOCK, mode));
         if (fd.Get() < 0) {
@@ -253,7 +250,7 @@ int TakeLock(int dirFd, const std::string& name, mode_t mode, const std::string&
                 throw std::runtime_error("Lock file '" + lockPath + "' is a symbolic link; remove it");
             throw std::runtime_error("Cannot open lock file '" + lockPath + "': " + Errno());
         }
-        struct stat st{};
+        struct stat st {};
         if (::fstat(fd.Get(), &st) != 0 || !S_ISREG(st.st_mode))
             throw std::runtime_error("Lock file '" + lockPath + "' is not a regular file; remove it");
         if ((st.st_mode & S_IRWXO) && st.st_uid == ::geteuid())
@@ -269,7 +266,7 @@ int TakeLock(int dirFd, const std::string& name, mode_t mode, const std::string&
                 throw std::runtime_error("Cannot lock '" + lockPath + "': " + Errno(error));
         }
         // A lock file removed or replaced while this process waited locks nothing: take the new one.
-        struct stat now{};
+        struct stat now {};
         if (::fstatat(dirFd, name.c_str(), &now, AT_SYMLINK_NOFOLLOW) == 0 && now.st_dev == st.st_dev &&
             now.st_ino == st.st_ino)
             return fd.Release();
@@ -382,7 +379,7 @@ void RemoveStaleTemporaries(int dirFd, const std::string& base)
             stale.emplace_back(entry->d_name);
     ::closedir(dir);
     for (const auto& name : stale) {
-        struct stat st{};
+        struct stat st {};
         if (::fstatat(dirFd, name.c_str(), &st, AT_SYMLINK_NOFOLLOW) != 0)
             continue;
         if (!S_ISDIR(st.st_mode)) {
@@ -426,7 +423,7 @@ std::pair<std::string, int> MakePrivateFolder(int dirFd, const std::string& base
             throw std::runtime_error(Errno());
         }
         const int fd = ::openat(dirFd, name.c_str(), O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC);
-        struct stat st{};
+        struct stat st {};
         if (fd < 0 || ::fstat(fd, &st) != 0 || st.st_uid != ::geteuid() || (st.st_mode & 077)) {
             // Someone put another folder in its place: leave it to its owner.
             if (fd >= 0)
@@ -458,7 +455,8 @@ void WriteAtomically(int dirFd, const std::string& base, const Model::State& sta
     auto cleanUp = [&] {
         if (fileMade)
             ::unlinkat(folder.Get(), kFile, 0);
-        struct stat mine{}, there{};
+        struct stat mine {
+        }, there{};
         if (::fstat(folder.Get(), &mine) == 0 &&
             ::fstatat(dirFd, folderName.c_str(), &there, AT_SYMLINK_NOFOLLOW) == 0 && mine.st_ino == there.st_ino &&
             mine.st_dev == there.st_dev)
@@ -483,9 +481,8 @@ void WriteAtomically(int dirFd, const std::string& base, const Model::State& sta
         }
         if (::fchmod(fd.Get(), identity.mode) != 0 || ::fsync(fd.Get()) != 0)
             throw std::runtime_error(Errno());
-        const int renamed = noReplace
-                                ? ::renameat2(folder.Get(), kFile, dirFd, base.c_str(), RENAME_NOREPLACE)
-                                : ::renameat(folder.Get(), kFile, dirFd, base.c_str());
+        const int renamed = noReplace ? ::renameat2(folder.Get(), kFile, dirFd, base.c_str(), RENAME_NOREPLACE)
+                                      : ::renameat(folder.Get(), kFile, dirFd, base.c_str());
         if (renamed != 0) {
             if (noReplace && errno == EEXIST)
                 throw StateFileExists("exists");
@@ -509,7 +506,7 @@ void Load(Session& session)
     session.dirty = false;
     const std::string what = "Cannot read host state file '" + session.path + "': ";
     Fd fd(::openat(session.dirFd, session.base.c_str(), O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC));
-    struct stat st{};
+    struct stat st {};
     if (fd.Get() < 0) {
         session.error = what + Errno();
         return;
@@ -543,10 +540,10 @@ void Save(Session& session)
         session.dirFd = ::open(session.dir.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
         if (session.dirFd < 0)
             throw std::runtime_error(Errno());
-        session.lockFd = TakeLock(session.dirFd, session.base + ".lock", (0666 & ~CurrentUmask()) & 0770,
-                                  session.path, session.resolved + ".lock");
+        session.lockFd = TakeLock(session.dirFd, session.base + ".lock", (0666 & ~CurrentUmask()) & 0770, session.path,
+                                  session.resolved + ".lock");
     }
-    struct stat st{};
+    struct stat st {};
     if (::fstatat(session.dirFd, session.base.c_str(), &st, AT_SYMLINK_NOFOLLOW) == 0) {
         if (!session.fromFile)
             throw std::runtime_error("another process created it while this command ran; run the command again");
@@ -607,10 +604,7 @@ std::string HomeFolder()
 
 namespace Runtime {
 
-void Throw(std::string message)
-{
-    throw HostCtlException(std::move(message));
-}
+void Throw(std::string message) { throw HostCtlException(std::move(message)); }
 
 State& CheckedState()
 {
@@ -639,10 +633,7 @@ void CheckFault(std::string_view call, std::initializer_list<std::string_view> t
     }
 }
 
-void MarkDirty()
-{
-    gSession.dirty = true;
-}
+void MarkDirty() { gSession.dirty = true; }
 
 namespace {
 // Records are kept in id order, so a binary search finds any of them; objects remember
@@ -652,8 +643,8 @@ Record* FindById(std::vector<Record>& list, std::uint64_t id, std::size_t& posit
 {
     if (position < list.size() && list[position].id == id)
         return &list[position];
-    auto it = std::lower_bound(list.begin(), list.end(), id,
-                               [](const Record& r, std::uint64_t key) { return r.id < key; });
+    auto it =
+        std::lower_bound(list.begin(), list.end(), id, [](const Record& r, std::uint64_t key) { return r.id < key; });
     if (it == list.end() || it->id != id)
         return nullptr;
     position = static_cast<std::size_t>(it - list.begin());
@@ -726,8 +717,9 @@ void WriteJournal(std::string_view call, const JournalEntry& entry, const std::s
         // a journal that cannot be written is said once.
         if (!gJournalWarned) {
             gJournalWarned = true;
-            const std::string warning = std::string("Cannot write the call journal '") + path + "': " +
-                                        (errno == ELOOP ? std::string("it is a symbolic link") : Errno()) + "\n";
+            const std::string warning = std::string("Cannot write the call journal '") + path +
+                                        "': " + (errno == ELOOP ? std::string("it is a symbolic link") : Errno()) +
+                                        "\n";
             (void)!::write(STDERR_FILENO, warning.data(), warning.size());
         }
     }
@@ -782,7 +774,7 @@ void OpenSession(const std::string& stateFile, const SessionOptions& options)
             throw;
         }
         // What is there now, under the lock, is what counts.
-        struct stat st{};
+        struct stat st {};
         if (::fstatat(session.dirFd, session.base.c_str(), &st, AT_SYMLINK_NOFOLLOW) != 0) {
             if (errno != ENOENT) {
                 const std::string why = Errno();
@@ -840,7 +832,7 @@ void InitState(const std::string& stateFile)
     const std::string exists = "Host state file '" + stateFile + "' already exists; --init-state leaves it as it is.";
     if (stateFile.empty())
         throw std::runtime_error("No host state file was given");
-    struct stat st{};
+    struct stat st {};
     if (::lstat(stateFile.c_str(), &st) == 0)
         throw StateFileExists(exists);
     if (errno != ENOENT)
@@ -871,9 +863,6 @@ std::string DumpState()
     return std::move(out).str(); // hands over the buffer: a large state is not copied again
 }
 
-void SetJournalSink(std::function<void(const std::string&)> sink)
-{
-    gJournalSink = std::move(sink);
-}
+void SetJournalSink(std::function<void(const std::string&)> sink) { gJournalSink = std::move(sink); }
 
 } // namespace HostSim

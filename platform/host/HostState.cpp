@@ -61,20 +61,14 @@ struct PlaceError {
     std::string what;
 };
 
-[[noreturn]] void Fail(const Where& where, std::string what)
-{
-    throw PlaceError{where.Text(), std::move(what)};
-}
+[[noreturn]] void Fail(const Where& where, std::string what) { throw PlaceError{where.Text(), std::move(what)}; }
 
 [[noreturn]] void WrongType(const Where& where, const char* expected, const json& value)
 {
     Fail(where, std::string("expected ") + expected + ", found " + value.type_name());
 }
 
-[[noreturn]] void UnknownKey(const Where& where)
-{
-    Fail(where, "unknown key");
-}
+[[noreturn]] void UnknownKey(const Where& where) { Fail(where, "unknown key"); }
 
 const std::string& Str(const json& v, const Where& w)
 {
@@ -112,8 +106,8 @@ std::int64_t Signed(const json& v, const Where& w, std::int64_t min, std::int64_
 
 std::int32_t Int32(const json& v, const Where& w)
 {
-    return static_cast<std::int32_t>(Signed(v, w, std::numeric_limits<std::int32_t>::min(),
-                                            std::numeric_limits<std::int32_t>::max()));
+    return static_cast<std::int32_t>(
+        Signed(v, w, std::numeric_limits<std::int32_t>::min(), std::numeric_limits<std::int32_t>::max()));
 }
 
 std::uint32_t Uint32(const json& v, const Where& w)
@@ -121,10 +115,7 @@ std::uint32_t Uint32(const json& v, const Where& w)
     return static_cast<std::uint32_t>(Unsigned(v, w, std::numeric_limits<std::uint32_t>::max()));
 }
 
-std::uint8_t Uint8(const json& v, const Where& w)
-{
-    return static_cast<std::uint8_t>(Unsigned(v, w, 255));
-}
+std::uint8_t Uint8(const json& v, const Where& w) { return static_cast<std::uint8_t>(Unsigned(v, w, 255)); }
 
 const json& Object(const json& v, const Where& w)
 {
@@ -162,13 +153,12 @@ std::string CanonicalMac(const json& v, const Where& w)
     const std::string& text = Str(v, w);
     unsigned bytes[6];
     char tail;
-    if (text.size() != 17 ||
-        std::sscanf(text.c_str(), "%2x:%2x:%2x:%2x:%2x:%2x%c", &bytes[0], &bytes[1], &bytes[2], &bytes[3],
-                    &bytes[4], &bytes[5], &tail) != 6)
+    if (text.size() != 17 || std::sscanf(text.c_str(), "%2x:%2x:%2x:%2x:%2x:%2x%c", &bytes[0], &bytes[1], &bytes[2],
+                                         &bytes[3], &bytes[4], &bytes[5], &tail) != 6)
         Fail(w, "expected a MAC address like 00:1e:67:c4:d2:a8, found '" + Cut(text) + "'");
     char out[18];
-    std::snprintf(out, sizeof out, "%02x:%02x:%02x:%02x:%02x:%02x", bytes[0], bytes[1], bytes[2], bytes[3],
-                  bytes[4], bytes[5]);
+    std::snprintf(out, sizeof out, "%02x:%02x:%02x:%02x:%02x:%02x", bytes[0], bytes[1], bytes[2], bytes[3], bytes[4],
+                  bytes[5]);
     return out;
 }
 
@@ -334,7 +324,8 @@ const FsField kFsFields[] = {
     {"remoteShare", FsKey::remoteShare,
      [](Record& r, const json& v, const Where& w) { r.MutableNfs().remoteShare = Str(v, w); },
      [](const Record& r) -> ojson { return r.Nfs().remoteShare; }},
-    {"readOnly", FsKey::readOnly, [](Record& r, const json& v, const Where& w) { r.MutableNfs().readOnly = Bool(v, w); },
+    {"readOnly", FsKey::readOnly,
+     [](Record& r, const json& v, const Where& w) { r.MutableNfs().readOnly = Bool(v, w); },
      [](const Record& r) -> ojson { return r.Nfs().readOnly; }},
     {"readOnlyState", FsKey::readOnlyState,
      [](Record& r, const json& v, const Where& w) { r.MutableNfs().readOnlyState = Bool(v, w); },
@@ -349,8 +340,8 @@ const FsField kFsFields[] = {
      [](const Record& r) -> ojson { return r.Nfs().knxnics; }},
     {"connections", FsKey::connections,
      [](Record& r, const json& v, const Where& w) {
-         r.MutableNfs().connections = Signed(v, w, std::numeric_limits<std::int64_t>::min(),
-                                             std::numeric_limits<std::int64_t>::max());
+         r.MutableNfs().connections =
+             Signed(v, w, std::numeric_limits<std::int64_t>::min(), std::numeric_limits<std::int64_t>::max());
      },
      [](const Record& r) -> ojson { return r.Nfs().connections; }},
     {"connectionsParam", FsKey::connectionsParam,
@@ -955,14 +946,14 @@ HlfsFields& DemoHlfs(Record& r, const char* lvmUuid, std::int32_t qaxiState, std
     h.majorVersion = majorVersion;
     h.lockMode = lockMode;
     h.atsSupport = 1;
-    for (FsKey key : {FsKey::lvmUuid, FsKey::qaxiState, FsKey::majorVersion, FsKey::lockMode, FsKey::atsSupport,
-                      FsKey::extents})
+    for (FsKey key :
+         {FsKey::lvmUuid, FsKey::qaxiState, FsKey::majorVersion, FsKey::lockMode, FsKey::atsSupport, FsKey::extents})
         r.Mark(key);
     return h;
 }
 
-User DemoUser(const char* heartbeatUuid, const char* mac, std::uint32_t major, std::uint32_t minor,
-              std::int64_t offset, std::uint8_t lockModeInUse)
+User DemoUser(const char* heartbeatUuid, const char* mac, std::uint32_t major, std::uint32_t minor, std::int64_t offset,
+              std::uint8_t lockModeInUse)
 {
     User u;
     u.heartbeatUuid = heartbeatUuid;
@@ -989,8 +980,8 @@ State BuildDemo()
     auto& fileSystems = st.fileSystems;
     fileSystems.reserve(6);
     {
-        auto r = DemoFileSystem(st, "HLFS", "datastore1", "5f8d2a31-6c1e47b2-9a0f-001e67c4d2a8", 536602476544,
-                                193273528320);
+        auto r =
+            DemoFileSystem(st, "HLFS", "datastore1", "5f8d2a31-6c1e47b2-9a0f-001e67c4d2a8", 536602476544, 193273528320);
         auto& h = DemoHlfs(r, "5f8d2a30-1b7c3d44-e2c1-001e67c4d2a8", 1, 6, 16);
         h.extents.push_back({"naa.600508b1001c7e4d2f9a8b3c6d5e4f10", 3});
         h.users.push_back(DemoUser("5f8d2a35-0a4c8e21-77d3-001e67c4d2a8", "00:1e:67:c4:d2:a8", 6, 82, 3145728, 4));
@@ -1055,8 +1046,8 @@ State BuildDemo()
     u.mountReason = 6;
     u.resignatureReason = 0;
     u.extents.push_back({false, "naa.60060160a620310045b9e1d7f3c8a054", 3, 0, 511743, true});
-    for (std::string_view key : {"volumeName", "uuid", "lvmUuid", "majorVersion", "capacity", "mountReason",
-                                 "resignatureReason", "extents"})
+    for (std::string_view key :
+         {"volumeName", "uuid", "lvmUuid", "majorVersion", "capacity", "mountReason", "resignatureReason", "extents"})
         u.Mark(key);
     u.id = st.nextUnresolvedId++;
     st.unresolvedVolumes.push_back(std::move(u));
@@ -1136,8 +1127,8 @@ void ResolveDefaults(FileSystemRecord& fs)
 }
 
 namespace {
-constexpr std::string_view kUnresolvedKeys[] = {"volumeName", "uuid", "lvmUuid", "majorVersion", "capacity",
-                                                "mountReason", "resignatureReason", "extents", "impl"};
+constexpr std::string_view kUnresolvedKeys[] = {
+    "volumeName", "uuid", "lvmUuid", "majorVersion", "capacity", "mountReason", "resignatureReason", "extents", "impl"};
 
 int UnresolvedKeyBit(std::string_view key)
 {
@@ -1199,8 +1190,8 @@ State ParseStream(std::istream& in, const std::string& source)
         StreamingReader reader(st, checked);
         json::sax_parse(input, &reader, json::input_format_t::json, true, false);
         if (!reader.root.is_object())
-            throw PlaceError{"", std::string("expected a JSON object at the top level, found ") +
-                                     reader.root.type_name()};
+            throw PlaceError{"",
+                             std::string("expected a JSON object at the top level, found ") + reader.root.type_name()};
         for (const auto& [key, value] : reader.root.items()) {
             const Where at{nullptr, key, -1};
             if (key == "fileSystems" && reader.StreamedFileSystems() && value.is_array() && value.empty())
@@ -1217,15 +1208,9 @@ State ParseStream(std::istream& in, const std::string& source)
 
 } // namespace
 
-State Parse(std::istream& in, const std::string& source)
-{
-    return ParseStream(in, source);
-}
+State Parse(std::istream& in, const std::string& source) { return ParseStream(in, source); }
 
-State Demo()
-{
-    return BuildDemo();
-}
+State Demo() { return BuildDemo(); }
 
 void Write(const State& st, std::ostream& out)
 {
@@ -1236,8 +1221,8 @@ void Write(const State& st, std::ostream& out)
     };
     auto value = [&](const ojson& v) { WriteReindented(out, v, "  "); };
 
-    if (st.Has(TopKey::features) || std::any_of(std::begin(st.features), std::end(st.features),
-                                                 [](const auto& f) { return f.has_value(); })) {
+    if (st.Has(TopKey::features) ||
+        std::any_of(std::begin(st.features), std::end(st.features), [](const auto& f) { return f.has_value(); })) {
         ojson features = ojson::object();
         for (int i = 0; i < 4; ++i)
             if (st.features[i])

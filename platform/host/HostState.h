@@ -83,11 +83,43 @@ struct NfsFields {
 
 // Keys of a file system entry; a bit is set when the key is to be written back.
 enum class FsKey : std::uint8_t {
-    type, volumeName, name, uuid, mountPoint, mounted, accessible, capacity, used, qaxiState, busy,
-    explicitlyUnmounted, majorVersion, lvmUuid, lockMode, atsSupport, extents, users, unmapProperty,
-    clusteredHdskEnabled, remoteHost, remoteHosts, remoteShare, readOnly, readOnlyState, isPE, hidden,
-    knxnic, knxnics, connections, connectionsParam, maxQueueDepth, maxReadTransferSize,
-    maxWriteTransferSize, securityType, preUnmount, count
+    type,
+    volumeName,
+    name,
+    uuid,
+    mountPoint,
+    mounted,
+    accessible,
+    capacity,
+    used,
+    qaxiState,
+    busy,
+    explicitlyUnmounted,
+    majorVersion,
+    lvmUuid,
+    lockMode,
+    atsSupport,
+    extents,
+    users,
+    unmapProperty,
+    clusteredHdskEnabled,
+    remoteHost,
+    remoteHosts,
+    remoteShare,
+    readOnly,
+    readOnlyState,
+    isPE,
+    hidden,
+    knxnic,
+    knxnics,
+    connections,
+    connectionsParam,
+    maxQueueDepth,
+    maxReadTransferSize,
+    maxWriteTransferSize,
+    securityType,
+    preUnmount,
+    count
 };
 
 struct FileSystemRecord {
@@ -177,8 +209,18 @@ using OptionGroup = std::vector<std::pair<std::string, OptionValue>>;
 
 // Top-level keys; a bit is set when the key is to be written back.
 enum class TopKey : std::uint8_t {
-    features, advancedOptions, behaviour, fileSystems, pendingRescan, unresolvedVolumes, nfsExports,
-    firewall, heaps, pointerBlockCache, faults, count
+    features,
+    advancedOptions,
+    behaviour,
+    fileSystems,
+    pendingRescan,
+    unresolvedVolumes,
+    nfsExports,
+    firewall,
+    heaps,
+    pointerBlockCache,
+    faults,
+    count
 };
 
 constexpr const char* kFeatureKeys[] = {"102", "103", "104", "270"};

@@ -11,15 +11,15 @@ namespace {
 
 namespace Runtime = HostSim::Runtime;
 namespace Objects = HostSim::Objects;
+using HostCtl::Storage::FileSystem;
+using HostCtl::Storage::HlFileSystem;
+using HostCtl::Storage::NetworkFileSystem;
+using HostCtl::Storage::NfsVersion;
 using HostSim::Model::FileSystemRecord;
 using HostSim::Model::FsKey;
 using HostSim::Model::FsKind;
 using HostSim::Model::State;
 using HostSim::Model::TopKey;
-using HostCtl::Storage::FileSystem;
-using HostCtl::Storage::HlFileSystem;
-using HostCtl::Storage::NetworkFileSystem;
-using HostCtl::Storage::NfsVersion;
 using J = nlohmann::ordered_json;
 
 // Runs a call that is not made on one volume object: state check, then faults matched
@@ -68,7 +68,8 @@ std::size_t FindNfs(const State& st, const std::string& name, bool v3, bool v41)
 {
     const auto& list = st.fileSystems;
     for (std::size_t i = 0; i < list.size(); ++i)
-        if (list[i].volumeName == name && ((v3 && list[i].kind == FsKind::Nfs) || (v41 && list[i].kind == FsKind::Nfs41)))
+        if (list[i].volumeName == name &&
+            ((v3 && list[i].kind == FsKind::Nfs) || (v41 && list[i].kind == FsKind::Nfs41)))
             return i;
     return std::string::npos;
 }
@@ -208,8 +209,9 @@ class HardwareInfoObject final : public HostCtl::HardwareInfo {
 public:
     std::unique_ptr<HostCtl::MemoryInfo> GetMemoryInfo() override
     {
-        return HostCall("HardwareInfo.GetMemoryInfo", {}, nullptr,
-                        [](State&) -> std::unique_ptr<HostCtl::MemoryInfo> { return std::make_unique<MemoryInfoObject>(); });
+        return HostCall("HardwareInfo.GetMemoryInfo", {}, nullptr, [](State&) -> std::unique_ptr<HostCtl::MemoryInfo> {
+            return std::make_unique<MemoryInfoObject>();
+        });
     }
 };
 
@@ -248,19 +250,19 @@ public:
     {
         return HostCall("AdvancedOptionGroup.GetOption", {name}, nullptr,
                         [&](State& st) -> std::unique_ptr<HostCtl::AdvancedOption> {
-            for (const auto& [group, options] : st.advancedOptions) {
-                if (group != group_)
-                    continue;
-                for (const auto& [optionName, value] : options) {
-                    if (optionName != name)
-                        continue;
-                    if (const auto* number = std::get_if<std::int64_t>(&value))
-                        return std::make_unique<IntegerOptionObject>(name, *number);
-                    return std::make_unique<StringOptionObject>(name, std::get<std::string>(value));
-                }
-            }
-            Runtime::Throw("Advanced option '" + group_ + "/" + name + "' not found");
-        });
+                            for (const auto& [group, options] : st.advancedOptions) {
+                                if (group != group_)
+                                    continue;
+                                for (const auto& [optionName, value] : options) {
+                                    if (optionName != name)
+                                        continue;
+                                    if (const auto* number = std::get_if<std::int64_t>(&value))
+                                        return std::make_unique<IntegerOptionObject>(name, *number);
+                                    return std::make_unique<StringOptionObject>(name, std::get<std::string>(value));
+                                }
+                            }
+                            Runtime::Throw("Advanced option '" + group_ + "/" + name + "' not found");
+                        });
     }
 
 private:
@@ -273,11 +275,11 @@ public:
     {
         return HostCall("AdvancedOptions.GetOptionGroup", {name}, nullptr,
                         [&](State& st) -> std::unique_ptr<HostCtl::AdvancedOptionGroup> {
-            for (const auto& entry : st.advancedOptions)
-                if (entry.first == name)
-                    return std::make_unique<OptionGroupObject>(name);
-            Runtime::Throw("Advanced option group '" + name + "' not found");
-        });
+                            for (const auto& entry : st.advancedOptions)
+                                if (entry.first == name)
+                                    return std::make_unique<OptionGroupObject>(name);
+                            Runtime::Throw("Advanced option group '" + name + "' not found");
+                        });
     }
 };
 
@@ -298,9 +300,10 @@ public:
     }
     std::unique_ptr<HostCtl::AdvancedOptions> GetAdvancedOptions() override
     {
-        return HostCall("Host.GetAdvancedOptions", {}, nullptr, [](State&) -> std::unique_ptr<HostCtl::AdvancedOptions> {
-            return std::make_unique<AdvancedOptionsObject>();
-        });
+        return HostCall("Host.GetAdvancedOptions", {}, nullptr,
+                        [](State&) -> std::unique_ptr<HostCtl::AdvancedOptions> {
+                            return std::make_unique<AdvancedOptionsObject>();
+                        });
     }
 };
 
@@ -354,10 +357,11 @@ std::unique_ptr<FileSystem> StorageInfoImpl::GetFileSystemByUuidEx(const std::st
 {
     if (HostLinux::Active())
         return HostLinux::Storage::GetFileSystemByUuid("StorageInfoImpl.GetFileSystemByUuidEx", uuid);
-    return HostCall("StorageInfoImpl.GetFileSystemByUuidEx", {uuid}, nullptr, [&](State&) -> std::unique_ptr<FileSystem> {
-        const FileSystemRecord* fs = Runtime::FirstByUuid(uuid);
-        return fs ? Objects::MakeFileSystem(*fs) : nullptr;
-    });
+    return HostCall("StorageInfoImpl.GetFileSystemByUuidEx", {uuid}, nullptr,
+                    [&](State&) -> std::unique_ptr<FileSystem> {
+                        const FileSystemRecord* fs = Runtime::FirstByUuid(uuid);
+                        return fs ? Objects::MakeFileSystem(*fs) : nullptr;
+                    });
 }
 
 std::unique_ptr<FileSystem> StorageInfoImpl::GetFileSystemByUUID(const std::string& uuid)
@@ -374,10 +378,11 @@ std::unique_ptr<FileSystem> StorageInfoImpl::GetFileSystemByLabel(const std::str
 {
     if (HostLinux::Active())
         return HostLinux::Storage::GetFileSystemByLabel(label);
-    return HostCall("StorageInfoImpl.GetFileSystemByLabel", {label}, nullptr, [&](State&) -> std::unique_ptr<FileSystem> {
-        const FileSystemRecord* fs = Runtime::FirstByVolumeName(label);
-        return fs ? Objects::MakeFileSystem(*fs) : nullptr;
-    });
+    return HostCall("StorageInfoImpl.GetFileSystemByLabel", {label}, nullptr,
+                    [&](State&) -> std::unique_ptr<FileSystem> {
+                        const FileSystemRecord* fs = Runtime::FirstByVolumeName(label);
+                        return fs ? Objects::MakeFileSystem(*fs) : nullptr;
+                    });
 }
 
 std::unique_ptr<FileSystem> StorageInfoImpl::GetFileSystemByPath(const std::string& path)
@@ -507,16 +512,13 @@ void StorageInfoImpl::RestorePsaConfig()
     HostCall("StorageInfoImpl.RestorePsaConfig", {}, &journal, [](State&) {});
 }
 
-std::unique_ptr<NetworkFileSystem> StorageInfoImpl::AddNetworkFileSystem(const std::string& host,
-                                                                         const std::string& share,
-                                                                         const std::string& volumeName,
-                                                                         bool knxnicBound, const std::string& knxnic,
-                                                                         std::uint32_t queueDepth,
-                                                                         std::int64_t connections)
+std::unique_ptr<NetworkFileSystem> StorageInfoImpl::AddNetworkFileSystem(
+    const std::string& host, const std::string& share, const std::string& volumeName, bool knxnicBound,
+    const std::string& knxnic, std::uint32_t queueDepth, std::int64_t connections)
 {
     if (HostLinux::Active())
         return HostLinux::Storage::AddNetworkFileSystem(host, share, volumeName, knxnicBound, knxnic, queueDepth,
-                                                          connections);
+                                                        connections);
     const Runtime::JournalEntry journal{
         volumeName, J::array({host, share, volumeName, knxnicBound, knxnic, queueDepth, connections})};
     return HostCall("StorageInfoImpl.AddNetworkFileSystem", {host, volumeName}, &journal, [&](State& st) {
@@ -553,32 +555,32 @@ std::unique_ptr<NetworkFileSystem> StorageInfoImpl::AddV41NetworkFileSystem(cons
     const Runtime::JournalEntry journal{volumeName,
                                         J::array({hosts, share, volumeName, static_cast<int>(security), knxnicBound})};
     const std::string_view firstHost = hosts.empty() ? std::string_view() : std::string_view(hosts.front());
-    return HostCall("StorageInfoImpl.AddV41NetworkFileSystem", {share, volumeName, firstHost}, &journal,
-                    [&](State& st) {
-        FileSystemRecord& fs = AppendNfs(st, FsKind::Nfs41, volumeName, share);
-        auto& nfs = fs.MutableNfs();
-        if (knxnicBound) {
-            std::string knxnics;
-            for (const auto& text : hosts) {
-                const auto colon = text.rfind(':');
-                nfs.remoteHosts.push_back(text.substr(0, colon));
-                const std::string knxnic = colon == std::string::npos ? std::string() : text.substr(colon + 1);
-                if (nfs.remoteHosts.size() == 1)
-                    nfs.knxnic = knxnic;
-                knxnics += (knxnics.empty() && nfs.remoteHosts.size() == 1 ? "" : ",") + knxnic;
+    return HostCall(
+        "StorageInfoImpl.AddV41NetworkFileSystem", {share, volumeName, firstHost}, &journal, [&](State& st) {
+            FileSystemRecord& fs = AppendNfs(st, FsKind::Nfs41, volumeName, share);
+            auto& nfs = fs.MutableNfs();
+            if (knxnicBound) {
+                std::string knxnics;
+                for (const auto& text : hosts) {
+                    const auto colon = text.rfind(':');
+                    nfs.remoteHosts.push_back(text.substr(0, colon));
+                    const std::string knxnic = colon == std::string::npos ? std::string() : text.substr(colon + 1);
+                    if (nfs.remoteHosts.size() == 1)
+                        nfs.knxnic = knxnic;
+                    knxnics += (knxnics.empty() && nfs.remoteHosts.size() == 1 ? "" : ",") + knxnic;
+                }
+                nfs.knxnics = knxnics;
+                fs.Mark(FsKey::knxnic);
+                fs.Mark(FsKey::knxnics);
+            } else {
+                nfs.remoteHosts = hosts;
             }
-            nfs.knxnics = knxnics;
-            fs.Mark(FsKey::knxnic);
-            fs.Mark(FsKey::knxnics);
-        } else {
-            nfs.remoteHosts = hosts;
-        }
-        fs.Mark(FsKey::remoteHosts);
-        nfs.securityType = static_cast<std::int32_t>(security);
-        fs.Mark(FsKey::securityType);
-        HostSim::Model::ResolveDefaults(fs);
-        return Objects::MakeNfs(fs);
-    });
+            fs.Mark(FsKey::remoteHosts);
+            nfs.securityType = static_cast<std::int32_t>(security);
+            fs.Mark(FsKey::securityType);
+            HostSim::Model::ResolveDefaults(fs);
+            return Objects::MakeNfs(fs);
+        });
 }
 
 void StorageInfoImpl::RemoveNetworkFileSystem(const std::string& volumeName)
@@ -603,7 +605,8 @@ std::vector<std::unique_ptr<NetworkFileSystem>> StorageInfoImpl::GetV3NetworkFil
     return NfsList("StorageInfoImpl.GetV3NetworkFileSystems", FsKind::Nfs, filter);
 }
 
-std::vector<std::unique_ptr<NetworkFileSystem>> StorageInfoImpl::GetV41NetworkFileSystems(NetworkFileSystemFilter filter)
+std::vector<std::unique_ptr<NetworkFileSystem>> StorageInfoImpl::GetV41NetworkFileSystems(
+    NetworkFileSystemFilter filter)
 {
     if (HostLinux::Active())
         return HostLinux::Storage::GetNetworkFileSystems(true, filter);

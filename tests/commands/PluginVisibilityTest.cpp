@@ -56,10 +56,8 @@ TEST(PluginVisibilityTest, ExportsOnlyTheRegistrationFunctions)
     }
     ASSERT_EQ(pclose(pipe), 0);
     const std::set<std::string> expected = {
-        "AutoCli_RegisterNamespaces",
-        "Core_RegisterInternalNamespaces",
-        "Nmp_RegisterInternalNamespaces",
-        "ClusteredHdsk_RegisterInternalNamespace",
+        "AutoCli_RegisterNamespaces",       "Core_RegisterInternalNamespaces",
+        "Nmp_RegisterInternalNamespaces",   "ClusteredHdsk_RegisterInternalNamespace",
         "FilesystemNfs_RegisterNamespaces",
     };
     EXPECT_EQ(ours, expected);

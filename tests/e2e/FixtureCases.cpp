@@ -107,7 +107,8 @@ TEST_P(FixtureCaseTest, MatchesExpectedOutput)
 std::string CaseName(const ::testing::TestParamInfo<std::string>& info)
 {
     std::string name = info.param.substr(0, info.param.size() - std::string(".case").size());
-    std::replace_if(name.begin(), name.end(), [](char c) { return !std::isalnum(static_cast<unsigned char>(c)); }, '_');
+    std::replace_if(
+        name.begin(), name.end(), [](char c) { return !std::isalnum(static_cast<unsigned char>(c)); }, '_');
     return name;
 }
 

@@ -73,8 +73,9 @@ TEST_P(PluginLoadingTest, UntrustedOrStrayLibrariesAreSkipped)
         GTEST_SKIP() << "no plain shared library found to stand for a stray file";
     Folder folder;
     const std::string plugins = c.setUp(folder);
-    const auto run = RunAutocli({"storage", "filesystem", "list"}, "",
-                                {"AUTOCLI_PLUGIN_PATH=" + plugins, "XDG_STATE_HOME=" + (folder / "xdg"), "AUTOCLI_STATE="});
+    const auto run =
+        RunAutocli({"storage", "filesystem", "list"}, "",
+                   {"AUTOCLI_PLUGIN_PATH=" + plugins, "XDG_STATE_HOME=" + (folder / "xdg"), "AUTOCLI_STATE="});
     EXPECT_EQ(run.exitCode, c.exitCode) << run.err;
     EXPECT_EQ(run.out.find("datastore1") != std::string::npos, c.listed) << run.out;
     EXPECT_EQ(run.err, c.err(folder));
@@ -148,7 +149,9 @@ const LoadCase kLoadCases[] = {
          return f / "p";
      },
      0, true,
-     [](const Folder& f) { return "Skipping plug-in '" + (f / "p/a.so") + "': '" + (f / "open") + "': " + kWritable + ".\n"; }},
+     [](const Folder& f) {
+         return "Skipping plug-in '" + (f / "p/a.so") + "': '" + (f / "open") + "': " + kWritable + ".\n";
+     }},
 };
 
 INSTANTIATE_TEST_SUITE_P(Loading, PluginLoadingTest, ::testing::ValuesIn(kLoadCases),
@@ -168,8 +171,8 @@ TEST(PluginFolder, NeverTheCurrentFolder)
     fs::copy_file(AUTOCLI_BINARY, folder / "autocli");
     const std::string libraries = fs::path(STORAGECLI_PLUGIN).parent_path().parent_path().parent_path().string();
     const std::string script = "mount -t tmpfs none /proc || exit 99; cd \"$1\" && ./autocli storage filesystem list";
-    const std::vector<std::string> args{"/usr/bin/unshare", "-m", "--propagation", "private", "/bin/sh", "-c",
-                                        script, "sh", folder / ""};
+    const std::vector<std::string> args{
+        "/usr/bin/unshare", "-m", "--propagation", "private", "/bin/sh", "-c", script, "sh", folder / ""};
     std::vector<char*> argv;
     for (const auto& arg : args)
         argv.push_back(const_cast<char*>(arg.c_str()));

@@ -61,7 +61,8 @@ TEST_F(Autocli, RunsACommandAndPrintsByFormatter)
 
 TEST_F(Autocli, HostFailureOutsideTheGuardIsExitThree)
 {
-    const auto state = State(R"({"faults": [{"call": "StorageInfoImpl.new", "message": "Host agent is not responding"}]})");
+    const auto state =
+        State(R"({"faults": [{"call": "StorageInfoImpl.new", "message": "Host agent is not responding"}]})");
     auto result = RunAutocli({"storage", "filesystem", "rescan"}, state);
     EXPECT_EQ(result.exitCode, 3);
     EXPECT_EQ(result.out, "");
@@ -118,20 +119,19 @@ TEST_F(Autocli, FormatParamsWithDifferentKeysCombine)
 TEST_F(Autocli, BoolParameterSpellings)
 {
     const std::vector<std::pair<std::string, bool>> spellings{
-        {"on", true}, {"ON", true}, {"Off", false}, {"off", false}, {"yes", true},
-        {"NO", false}, {"1", true}, {"0", false}, {"True", true}, {"FALSE", false}};
+        {"on", true},  {"ON", true}, {"Off", false}, {"off", false}, {"yes", true},
+        {"NO", false}, {"1", true},  {"0", false},   {"True", true}, {"FALSE", false}};
     const auto state = DemoState();
     for (const auto& [text, value] : spellings) {
         // Start from the other state, so that an ignored value cannot pass.
-        auto before = RunAutocli({"storage", "internal", "clusteredhdsk", "set", "-l", "datastore1", "-e",
-                                  value ? "false" : "true"},
-                                 state);
+        auto before = RunAutocli(
+            {"storage", "internal", "clusteredhdsk", "set", "-l", "datastore1", "-e", value ? "false" : "true"}, state);
         ASSERT_EQ(before.exitCode, 0) << before.err;
-        auto set = RunAutocli({"storage", "internal", "clusteredhdsk", "set", "-l", "datastore1", "--enabled", text},
-                              state);
+        auto set =
+            RunAutocli({"storage", "internal", "clusteredhdsk", "set", "-l", "datastore1", "--enabled", text}, state);
         EXPECT_EQ(set.exitCode, 0) << text << ": " << set.err;
-        auto get = RunAutocli({"--formatter", "json", "storage", "internal", "clusteredhdsk", "get", "-l", "datastore1"},
-                              state);
+        auto get = RunAutocli(
+            {"--formatter", "json", "storage", "internal", "clusteredhdsk", "get", "-l", "datastore1"}, state);
         ASSERT_EQ(get.exitCode, 0) << get.err;
         EXPECT_EQ(nlohmann::json::parse(get.out)["Enabled"], value) << text;
     }
@@ -174,7 +174,8 @@ TEST_F(Autocli, BrokenPluginIsNamedNotACrash)
     std::ofstream(dir_ / "plugins" / "junk.so") << "not a library";
     auto junk = RunAutocli({"storage", "--help"}, DemoState(), {PluginEnv()});
     EXPECT_EQ(junk.exitCode, 3);
-    EXPECT_EQ(junk.err.rfind("Cannot load plug-in '" + (dir_ / "plugins" / "junk.so").string() + "'", 0), 0u) << junk.err;
+    EXPECT_EQ(junk.err.rfind("Cannot load plug-in '" + (dir_ / "plugins" / "junk.so").string() + "'", 0), 0u)
+        << junk.err;
 
     // A second copy of the real plug-in registers the same names again.
     fs::remove(dir_ / "plugins" / "junk.so");

@@ -20,7 +20,9 @@ class FakeCommand : public virtual Quillets::AutoCli::Command {
 public:
     std::function<void(InputSpec&, FakeCommand&)> describe;
     std::function<std::shared_ptr<MetaObject>()> shape = [] { return MetaBool::New(); };
-    std::function<void(const Input&, Output&)> run = [](const Input&, Output& out) { out.SetRootObject(MetaBool::New(true)); };
+    std::function<void(const Input&, Output&)> run = [](const Input&, Output& out) {
+        out.SetRootObject(MetaBool::New(true));
+    };
     int executions = 0;
     std::shared_ptr<Input> lastInput;
 
@@ -57,7 +59,8 @@ protected:
 };
 
 inline std::shared_ptr<ParameterSpec> Param(const std::string& name, const std::string& shortName, ParameterType type,
-                                            bool required = false, std::shared_ptr<ParameterConstraint> constraint = nullptr)
+                                            bool required = false,
+                                            std::shared_ptr<ParameterConstraint> constraint = nullptr)
 {
     auto parameter = ParameterSpec::New(name, type);
     parameter->SetShortName(shortName);

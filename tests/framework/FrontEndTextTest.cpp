@@ -33,26 +33,34 @@ TEST_P(Widths, CellsShowAndMeasureAsATerminalDoes)
     EXPECT_EQ(Text::DisplayWidth(c.shown), c.width);
 }
 
-INSTANTIATE_TEST_SUITE_P(
-    EachKind, Widths,
-    ::testing::Values(WidthCase{"ascii", "plain", "plain", 5},
-                      WidthCase{"cjk_two_columns_each", "\xe6\x95\xb0\xe6\x8d\xae", "\xe6\x95\xb0\xe6\x8d\xae", 4},
-                      WidthCase{"fullwidth_latin", "\xef\xbd\x86", "\xef\xbd\x86", 2},
-                      WidthCase{"hangul_syllable", "\xea\xb0\x80", "\xea\xb0\x80", 2},
-                      WidthCase{"combining_mark_none", "e\xcc\x81", "e\xcc\x81", 1},
-                      WidthCase{"zero_width_space_none", "a\xe2\x80\x8b" "b", "a\xe2\x80\x8b" "b", 2},
-                      WidthCase{"latin_accented", "caf\xc3\xa9", "caf\xc3\xa9", 4},
-                      WidthCase{"tab_and_newline", "a\tb\n", "a\\tb\\n", 6},
-                      WidthCase{"c0_and_delete", std::string("\x01\x7f", 2), "\\x01\\x7f", 8},
-                      WidthCase{"c1_control_escaped", "\xc2\x9b" "31m", "\\xc2\\x9b31m", 11},
-                      WidthCase{"line_separator_escaped", "a\xe2\x80\xa8", "a\\xe2\\x80\\xa8", 13},
-                      WidthCase{"lone_continuation_byte", "a\x80z", "a\\x80z", 6},
-                      WidthCase{"truncated_sequence", "\xe6\x95", "\\xe6\\x95", 8},
-                      WidthCase{"overlong_slash", "\xc0\xaf", "\\xc0\\xaf", 8},
-                      WidthCase{"surrogate", "\xed\xa0\x80", "\\xed\\xa0\\x80", 12},
-                      WidthCase{"beyond_unicode", "\xf4\x90\x80\x80", "\\xf4\\x90\\x80\\x80", 16},
-                      WidthCase{"bad_lead_then_wide", "\xff\xe6\x95\xb0", "\\xff\xe6\x95\xb0", 6}),
-    [](const auto& info) { return std::string(info.param.name); });
+INSTANTIATE_TEST_SUITE_P(EachKind, Widths,
+                         ::testing::Values(WidthCase{"ascii", "plain", "plain", 5},
+                                           WidthCase{"cjk_two_columns_each", "\xe6\x95\xb0\xe6\x8d\xae",
+                                                     "\xe6\x95\xb0\xe6\x8d\xae", 4},
+                                           WidthCase{"fullwidth_latin", "\xef\xbd\x86", "\xef\xbd\x86", 2},
+                                           WidthCase{"hangul_syllable", "\xea\xb0\x80", "\xea\xb0\x80", 2},
+                                           WidthCase{"combining_mark_none", "e\xcc\x81", "e\xcc\x81", 1},
+                                           WidthCase{"zero_width_space_none",
+                                                     "a\xe2\x80\x8b"
+                                                     "b",
+                                                     "a\xe2\x80\x8b"
+                                                     "b",
+                                                     2},
+                                           WidthCase{"latin_accented", "caf\xc3\xa9", "caf\xc3\xa9", 4},
+                                           WidthCase{"tab_and_newline", "a\tb\n", "a\\tb\\n", 6},
+                                           WidthCase{"c0_and_delete", std::string("\x01\x7f", 2), "\\x01\\x7f", 8},
+                                           WidthCase{"c1_control_escaped",
+                                                     "\xc2\x9b"
+                                                     "31m",
+                                                     "\\xc2\\x9b31m", 11},
+                                           WidthCase{"line_separator_escaped", "a\xe2\x80\xa8", "a\\xe2\\x80\\xa8", 13},
+                                           WidthCase{"lone_continuation_byte", "a\x80z", "a\\x80z", 6},
+                                           WidthCase{"truncated_sequence", "\xe6\x95", "\\xe6\\x95", 8},
+                                           WidthCase{"overlong_slash", "\xc0\xaf", "\\xc0\\xaf", 8},
+                                           WidthCase{"surrogate", "\xed\xa0\x80", "\\xed\\xa0\\x80", 12},
+                                           WidthCase{"beyond_unicode", "\xf4\x90\x80\x80", "\\xf4\\x90\\x80\\x80", 16},
+                                           WidthCase{"bad_lead_then_wide", "\xff\xe6\x95\xb0", "\\xff\xe6\x95\xb0", 6}),
+                         [](const auto& info) { return std::string(info.param.name); });
 
 struct SuggestCase {
     const char* name;
@@ -87,8 +95,7 @@ INSTANTIATE_TEST_SUITE_P(
                       SuggestCase{"all_letters_replaced", "ab", {"cd"}, ""},
                       SuggestCase{"equally_close", "zet", {"get", "set"}, ""},
                       SuggestCase{"closer_one_wins", "sets", {"get", "set"}, "set"},
-                      SuggestCase{"nothing_typed", "", kCommands, ""},
-                      SuggestCase{"no_candidates", "list", {}, ""},
+                      SuggestCase{"nothing_typed", "", kCommands, ""}, SuggestCase{"no_candidates", "list", {}, ""},
                       SuggestCase{"same_word_twice_is_one", "lst", {"list", "list"}, "list"}),
     [](const auto& info) { return std::string(info.param.name); });
 
@@ -102,10 +109,7 @@ void PrintTo(const RoffCase& c, std::ostream* os) { *os << c.name; }
 
 class Roff : public ::testing::TestWithParam<RoffCase> {};
 
-TEST_P(Roff, TextIsNeverMarkup)
-{
-    EXPECT_EQ(RoffText(GetParam().text), GetParam().roff);
-}
+TEST_P(Roff, TextIsNeverMarkup) { EXPECT_EQ(RoffText(GetParam().text), GetParam().roff); }
 
 INSTANTIATE_TEST_SUITE_P(
     Each, Roff,
@@ -117,7 +121,10 @@ INSTANTIATE_TEST_SUITE_P(
                       RoffCase{"double_quote", "say \"x\"", "say \\(dqx\\(dq"},
                       RoffCase{"beyond_ascii", "caf\xc3\xa9 \xe6\x95\xb0", "caf\\[u00E9] \\[u6570]"},
                       RoffCase{"invalid_utf8", "a\xff", "a\\[uFFFD]"},
-                      RoffCase{"control_character", "a\x01" "b", "a b"}),
+                      RoffCase{"control_character",
+                               "a\x01"
+                               "b",
+                               "a b"}),
     [](const auto& info) { return std::string(info.param.name); });
 
 } // namespace

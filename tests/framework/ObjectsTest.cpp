@@ -76,8 +76,8 @@ TEST(Values, FieldObjectsFollowChangesAndKeepGivenObjects)
 
 TEST(Text, EscapedWidthIsTheWidthOfTheEscapedText)
 {
-    for (const std::string& text : {std::string(), std::string("plain"), std::string("a\tb\n"), std::string("\x01\x7f", 2),
-                                   std::string("\xc3\xa9t\xc3\xa9\r")}) {
+    for (const std::string& text : {std::string(), std::string("plain"), std::string("a\tb\n"),
+                                    std::string("\x01\x7f", 2), std::string("\xc3\xa9t\xc3\xa9\r")}) {
         EXPECT_EQ(Quillets::Cli::Text::EscapedWidth(text),
                   Quillets::Cli::Text::DisplayWidth(Quillets::Cli::Text::EscapeControl(text)))
             << text;
@@ -134,7 +134,10 @@ TEST_F(ShellCmd, FeedsInputCollectsBothStreamsAndJournals)
     EXPECT_EQ(output, "VOL1\nVOL2\noops\n");
     const auto lines = Journal();
     ASSERT_EQ(lines.size(), 1u);
-    EXPECT_EQ(lines[0], nlohmann::json::parse(R"({"call":"AutoCli_ShellCmd","target":"","args":["tr a-z A-Z; echo oops >&2; exit 3","vol1\nvol2\n"]})"));
+    EXPECT_EQ(
+        lines[0],
+        nlohmann::json::parse(
+            R"({"call":"AutoCli_ShellCmd","target":"","args":["tr a-z A-Z; echo oops >&2; exit 3","vol1\nvol2\n"]})"));
 }
 
 TEST_F(ShellCmd, LargeInputAndOutputDoNotDeadlock)

@@ -20,8 +20,8 @@ std::shared_ptr<MetaList> TwoVolumes()
     return list;
 }
 
-std::string Render(const std::shared_ptr<MetaObject>& result, const std::string& formatter, const OutputHints& hints = {},
-                   OutputOptions options = {})
+std::string Render(const std::shared_ptr<MetaObject>& result, const std::string& formatter,
+                   const OutputHints& hints = {}, OutputOptions options = {})
 {
     options.formatter = formatter;
     return RenderResult(result, result, hints, options);
@@ -55,7 +55,11 @@ const OutputHints kHinted{"table", {{"fields:Volume", "Mounted, Name"}, {"units:
 INSTANTIATE_TEST_SUITE_P(
     Formatters, ListRendering,
     ::testing::Values(
-        RenderCase{"table_all_fields", "table", {}, std::nullopt, true,
+        RenderCase{"table_all_fields",
+                   "table",
+                   {},
+                   std::nullopt,
+                   true,
                    "Name           Size  Mounted\n"
                    "-------------  ----  -------\n"
                    "datastore1     1024  true\n"
@@ -69,9 +73,13 @@ INSTANTIATE_TEST_SUITE_P(
                    "1024\n-5\n"},
         RenderCase{"simple_units_follow_hint", "simple", kHinted, std::vector<std::string>{"Name", "Size"}, true,
                    "   Name: datastore1\n   Size: 1024 MiB\n\n   Name: big, \"quoted\"\n   Size: -5 MiB\n"},
-        RenderCase{"simple_header_indents", "simple",
-                   {"", {{"header:Volume", "Volume %Name% (%Missing%)"}, {"fields:Volume", "Size"}}}, std::nullopt, true,
-                   "Volume datastore1 (%Missing%)\n      Size: 1024\n\nVolume big, \"quoted\" (%Missing%)\n      Size: -5\n"},
+        RenderCase{
+            "simple_header_indents",
+            "simple",
+            {"", {{"header:Volume", "Volume %Name% (%Missing%)"}, {"fields:Volume", "Size"}}},
+            std::nullopt,
+            true,
+            "Volume datastore1 (%Missing%)\n      Size: 1024\n\nVolume big, \"quoted\" (%Missing%)\n      Size: -5\n"},
         RenderCase{"csv_quotes_per_rfc4180", "csv", kHinted, std::nullopt, true,
                    "Mounted,Name\ntrue,datastore1\nfalse,\"big, \"\"quoted\"\"\"\n"},
         RenderCase{"json_ignores_field_hint", "json", kHinted, std::nullopt, true,
@@ -86,7 +94,8 @@ TEST(Render, SingleStructureIsOneRowTableAndAnObject)
     auto single = Volume("vol", 7, true);
     EXPECT_EQ(Render(single, "table"), "Name  Size  Mounted\n----  ----  -------\nvol   7     true\n");
     EXPECT_EQ(Render(single, "simple"), "   Name: vol\n   Size: 7\n   Mounted: true\n");
-    EXPECT_EQ(nlohmann::json::parse(Render(single, "json")), nlohmann::json({{"Name", "vol"}, {"Size", 7}, {"Mounted", true}}));
+    EXPECT_EQ(nlohmann::json::parse(Render(single, "json")),
+              nlohmann::json({{"Name", "vol"}, {"Size", 7}, {"Mounted", true}}));
 }
 
 TEST(Render, BooleanRootIsSilentExceptInJson)

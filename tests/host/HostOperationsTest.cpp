@@ -1,7 +1,7 @@
 // The semantics of the host operations that the plug-in relies on.
 
-#include <functional>
 #include <array>
+#include <functional>
 #include <optional>
 #include <regex>
 
@@ -47,10 +47,10 @@ std::vector<std::string> Names(const auto& objects)
 TEST(HostOperations, IpStringClassification)
 {
     const std::pair<const char*, int> cases[] = {
-        {"10.0.0.0/8", 1},  {"10.0.0.1/0", 1},      {"10.0.0.1/32", 1},     {"10.0.0.1/33", 0},
-        {"10.0.0.1", 2},    {"10.0.0.256", 0},      {"10.0.0", 0},          {"fd00::/64", 3},
-        {"::1/128", 3},     {"::1/129", 0},         {"fd00:1:2::9", 4},     {"10.0.0.1/", 0},
-        {"10.0.0.1/-1", 0}, {"10.0.0.1/8x", 0},     {"host.example", 0},    {"", 0},
+        {"10.0.0.0/8", 1},  {"10.0.0.1/0", 1},   {"10.0.0.1/32", 1},  {"10.0.0.1/33", 0},
+        {"10.0.0.1", 2},    {"10.0.0.256", 0},   {"10.0.0", 0},       {"fd00::/64", 3},
+        {"::1/128", 3},     {"::1/129", 0},      {"fd00:1:2::9", 4},  {"10.0.0.1/", 0},
+        {"10.0.0.1/-1", 0}, {"10.0.0.1/8x", 0},  {"host.example", 0}, {"", 0},
         {"::/0", 3},        {"1.2.3.4/24/8", 0},
     };
     for (const auto& [text, type] : cases)
@@ -139,8 +139,8 @@ TEST(HostOperations, TryMount)
         bool result;
     };
     const Case cases[] = {
-        {true, "u1", "", true},   {true, "", "a", true},   {true, "u1", "a", true}, {true, "u1", "b", false},
-        {true, "", "", false},    {false, "u1", "a", false}, {true, "u2", "", false}, // u2 is mounted already
+        {true, "u1", "", true}, {true, "", "a", true},     {true, "u1", "a", true}, {true, "u1", "b", false},
+        {true, "", "", false},  {false, "u1", "a", false}, {true, "u2", "", false}, // u2 is mounted already
     };
     for (const auto& c : cases) {
         ScopedHost host(std::string(R"({"behaviour": {"tryMount": )") + (c.enabled ? "true" : "false") +
@@ -317,8 +317,8 @@ TEST(HostOperations, SnapshotsMountAndResignature)
         bool result;
         unsigned code;
     };
-    for (const auto& c : {Check{replica, true, false, 6}, Check{replica, false, true, 0},
-                          Check{old, true, true, 0}, Check{old, false, false, 3}}) {
+    for (const auto& c : {Check{replica, true, false, 6}, Check{replica, false, true, 0}, Check{old, true, true, 0},
+                          Check{old, false, false, 3}}) {
         unsigned code = 99;
         EXPECT_EQ(c.copy->CanResolve(false, c.second, &code), c.result);
         EXPECT_EQ(code, c.code);

@@ -8,9 +8,9 @@
 
 #include <ostream>
 
+#include <fcntl.h>
 #include <gtest/gtest.h>
 #include <sys/file.h>
-#include <fcntl.h>
 #include <unistd.h>
 
 #include "FeatureList.h"
@@ -37,10 +37,7 @@ std::string ReadFile(const std::string& path)
     return text.str();
 }
 
-bool Exists(const std::string& path)
-{
-    return ::access(path.c_str(), F_OK) == 0;
-}
+bool Exists(const std::string& path) { return ::access(path.c_str(), F_OK) == 0; }
 
 std::string MessageOf(const std::function<void()>& call)
 {
@@ -107,8 +104,9 @@ const BadState kBadStates[] = {
     // Long texts are cut: neither a huge key nor a huge token makes a huge message.
     {"longKeyIsCut", "{\"" + std::string(100000, 'k') + "\": 1}", std::string(80, 'k') + "...: unknown key"},
     {"longTokenIsCut", "{\"a\": \"" + std::string(100000, 'x'), "last read: '\"" + std::string(79, 'x') + "...'"},
-    {"longMacIsCut", R"({"fileSystems": [{"type": "HLFS", "volumeName": "a", "users": [{"macAddress": ")" +
-                         std::string(100000, 'm') + "\"}]}]}",
+    {"longMacIsCut",
+     R"({"fileSystems": [{"type": "HLFS", "volumeName": "a", "users": [{"macAddress": ")" + std::string(100000, 'm') +
+         "\"}]}]}",
      "found '" + std::string(80, 'm') + "...'"},
 };
 
@@ -249,7 +247,9 @@ TEST(HostState, BuiltInDemoHostIsTheDescribedOne)
     for (std::size_t i = 0; i < builtIn.fileSystems.size(); ++i) {
         const auto& a = builtIn.fileSystems[i];
         const auto& b = described.fileSystems[i];
-        EXPECT_EQ(std::tie(a.id, a.kind, a.name, a.mountPoint, a.present), std::tie(b.id, b.kind, b.name, b.mountPoint, b.present)) << i;
+        EXPECT_EQ(std::tie(a.id, a.kind, a.name, a.mountPoint, a.present),
+                  std::tie(b.id, b.kind, b.name, b.mountPoint, b.present))
+            << i;
         EXPECT_EQ(a.Nfs().readOnlyState, b.Nfs().readOnlyState) << i;
         EXPECT_EQ(a.Nfs().connectionsParam, b.Nfs().connectionsParam) << i;
         EXPECT_EQ(a.Nfs().securityType, b.Nfs().securityType) << i;

@@ -67,10 +67,7 @@ std::string ReadFile(const std::string& path)
     return text.str();
 }
 
-void WriteFile(const std::string& path, const std::string& text)
-{
-    std::ofstream(path, std::ios::binary) << text;
-}
+void WriteFile(const std::string& path, const std::string& text) { std::ofstream(path, std::ios::binary) << text; }
 
 // Every name under `root`, with a trailing "/" for folders and "@" for links.
 std::vector<std::string> Tree(const std::string& root)
@@ -100,7 +97,7 @@ bool HasTemporaries(const std::string& folder)
 
 struct stat Lstat(const std::string& path)
 {
-    struct stat st{};
+    struct stat st {};
     if (::lstat(path.c_str(), &st) != 0)
         st.st_ino = 0;
     return st;
@@ -115,10 +112,7 @@ std::string InitState(const Folder& folder, const std::string& name = "host.json
     return path;
 }
 
-std::string Quoted(const std::string& path)
-{
-    return "'" + path + "'";
-}
+std::string Quoted(const std::string& path) { return "'" + path + "'"; }
 
 // ---- what a save leaves on disk ----------------------------------------------------------
 
@@ -279,10 +273,7 @@ TEST_P(StatePathTest, RefusedAtOnceAndNothingIsCreated)
 const std::vector<std::string> kList{"storage", "filesystem", "list"};
 const std::vector<std::string> kChange{"storage", "filesystem", "unmount", "-l", "datastore1"};
 
-std::vector<std::string> StateArgs(const std::string& path)
-{
-    return {"--state", path};
-}
+std::vector<std::string> StateArgs(const std::string& path) { return {"--state", path}; }
 
 const PathCase kPathCases[] = {
     {"fifo",
@@ -290,13 +281,15 @@ const PathCase kPathCases[] = {
          ::mkfifo((f / "host.json").c_str(), 0600);
          return StateArgs(f / "host.json");
      },
-     kList, 3, [](const Folder& f) { return "Host state file " + Quoted(f / "host.json") + " is not a regular file\n"; }},
+     kList, 3,
+     [](const Folder& f) { return "Host state file " + Quoted(f / "host.json") + " is not a regular file\n"; }},
     {"folder",
      [](const Folder& f) {
          fs::create_directory(f / "host.json");
          return StateArgs(f / "host.json");
      },
-     kList, 3, [](const Folder& f) { return "Host state file " + Quoted(f / "host.json") + " is not a regular file\n"; }},
+     kList, 3,
+     [](const Folder& f) { return "Host state file " + Quoted(f / "host.json") + " is not a regular file\n"; }},
     {"symlinkLoop",
      [](const Folder& f) {
          fs::create_symlink(f / "b.json", f / "a.json");
@@ -308,7 +301,9 @@ const PathCase kPathCases[] = {
          return "Cannot use host state file " + Quoted(f / "a.json") + ": Too many levels of symbolic links\n";
      }},
     {"componentNotAFolder", [](const Folder& f) { return StateArgs(f / "victim/host.json"); }, kList, 3,
-     [](const Folder& f) { return "Cannot use host state file " + Quoted(f / "victim/host.json") + ": Not a directory\n"; }},
+     [](const Folder& f) {
+         return "Cannot use host state file " + Quoted(f / "victim/host.json") + ": Not a directory\n";
+     }},
     // The default path too: a path that cannot be examined is never the demo host.
     {"defaultPathInALoop",
      [](const Folder& f) {
@@ -337,7 +332,9 @@ const PathCase kPathCases[] = {
          return StateArgs(f / "host.json");
      },
      kChange, 3,
-     [](const Folder& f) { return "Lock file " + Quoted(f / "host.json.lock") + " is not a regular file; remove it\n"; }},
+     [](const Folder& f) {
+         return "Lock file " + Quoted(f / "host.json.lock") + " is not a regular file; remove it\n";
+     }},
     {"namedFileMissing", [](const Folder& f) { return StateArgs(f / "nope/host.json"); }, kChange, 2,
      [](const Folder& f) {
          return "State file " + Quoted(f / "nope/host.json") +
@@ -354,7 +351,8 @@ const PathCase kPathCases[] = {
          fs::create_symlink(f / "created-by-root", f / "host.json");
          return std::vector<std::string>{"--state", f / "host.json", "--init-state"};
      },
-     {}, 1,
+     {},
+     1,
      [](const Folder& f) {
          return "Host state file " + Quoted(f / "host.json") + " already exists; --init-state leaves it as it is.\n";
      }},
@@ -407,8 +405,13 @@ TEST(StateStore, OnlyAChangeWritesTheDemoHost)
 {
     Folder folder;
     const std::vector<std::vector<std::string>> quiet{
-        {"--help"},   {"--version"}, {"storage", "filesystem", "nope"}, kList, {"--dump-state"},
-        {"storage", "filesystem", "list", "--formatter"}, {"--dry-run", "storage", "filesystem", "unmount", "-a"},
+        {"--help"},
+        {"--version"},
+        {"storage", "filesystem", "nope"},
+        kList,
+        {"--dump-state"},
+        {"storage", "filesystem", "list", "--formatter"},
+        {"--dry-run", "storage", "filesystem", "unmount", "-a"},
     };
     for (const auto& args : quiet) {
         const auto run = RunAutocli(args, "", folder.Env());
@@ -418,7 +421,7 @@ TEST(StateStore, OnlyAChangeWritesTheDemoHost)
     const auto change = RunAutocli(kChange, "", folder.Env());
     EXPECT_EQ(change.exitCode, 0) << change.err;
     EXPECT_EQ(Tree(folder.Path()), (std::vector<std::string>{"xdg/", "xdg/autocli/", "xdg/autocli/host.json",
-                                                              "xdg/autocli/host.json.lock"}));
+                                                             "xdg/autocli/host.json.lock"}));
     EXPECT_EQ((Lstat(folder / "xdg/autocli").st_mode & 0777), 0700u);
 }
 

@@ -73,10 +73,9 @@ std::string Elements(const nlohmann::json& listing, const std::string& set)
         if (!item.contains("set") || item["set"]["name"] != set || !item["set"].contains("elem"))
             continue;
         for (const auto& e : item["set"]["elem"])
-            result += (result.empty() ? "" : ",") +
-                      (e.is_string() ? e.get<std::string>()
-                                     : e["prefix"]["addr"].get<std::string>() + "/" +
-                                           std::to_string(e["prefix"]["len"].get<int>()));
+            result += (result.empty() ? "" : ",") + (e.is_string() ? e.get<std::string>()
+                                                                   : e["prefix"]["addr"].get<std::string>() + "/" +
+                                                                         std::to_string(e["prefix"]["len"].get<int>()));
     }
     return result;
 }
@@ -151,7 +150,8 @@ TEST(Firewall, ListingInAFreshNamespaceIsEmptyAndMakesNothing)
     if (auto problem = LinuxTest::NamespaceProblem({"-n"}))
         GTEST_SKIP() << *problem;
     const auto ran = LinuxTest::RunInNamespaces(
-        {"-n"}, R"("$AUTOCLI" --host linux --formatter json storage nfs41 firewall list; echo "@@$?"; nft -j list tables)");
+        {"-n"},
+        R"("$AUTOCLI" --host linux --formatter json storage nfs41 firewall list; echo "@@$?"; nft -j list tables)");
     ASSERT_EQ(ran.exitCode, 0) << ran.err;
     EXPECT_NE(ran.out.find("\"Allowed IPMask\": \"\""), std::string::npos) << ran.out;
     EXPECT_NE(ran.out.find("@@0"), std::string::npos) << ran.out << ran.err;

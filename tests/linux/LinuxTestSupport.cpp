@@ -132,7 +132,8 @@ Ran RunInNamespaces(const std::vector<std::string>& flags, const std::string& sc
     return Run(argv, fullEnv);
 }
 
-const char* const kStepFunction = "step() { name=$1; shift; out=$(\"$@\" 2>&1); echo \"@@$name $?\"; echo \"$out\"; }\n";
+const char* const kStepFunction =
+    "step() { name=$1; shift; out=$(\"$@\" 2>&1); echo \"@@$name $?\"; echo \"$out\"; }\n";
 
 std::map<std::string, Step> ParseSteps(const std::string& out)
 {
@@ -162,8 +163,8 @@ std::optional<std::string> NamespaceProblem(const std::vector<std::string>& flag
     std::string flagText;
     for (const auto& f : flags)
         flagText += " " + f;
-    return "cannot make a private namespace (unshare" + flagText + "): " +
-           (ran.err.empty() ? "exit " + std::to_string(ran.exitCode) : ran.err);
+    return "cannot make a private namespace (unshare" + flagText +
+           "): " + (ran.err.empty() ? "exit " + std::to_string(ran.exitCode) : ran.err);
 }
 
 std::string InPrivateMountNamespace(const std::function<std::string()>& body)
@@ -242,10 +243,7 @@ std::string ReadFile(const std::string& path)
     return text.str();
 }
 
-void WriteFile(const std::string& path, const std::string& text)
-{
-    std::ofstream(path, std::ios::binary) << text;
-}
+void WriteFile(const std::string& path, const std::string& text) { std::ofstream(path, std::ios::binary) << text; }
 
 bool KernelHasNfsClient()
 {

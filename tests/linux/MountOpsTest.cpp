@@ -96,7 +96,7 @@ TEST(MountOps, LinksInTheWayAreRefused)
         EXPECT_THROW(OpenMountPoint(registry, "vol"), std::runtime_error);
     }
     // Nothing was made where the links point.
-    struct stat st{};
+    struct stat st {};
     EXPECT_NE(::stat((elsewhere + "/vol").c_str(), &st), 0);
 }
 

@@ -19,7 +19,8 @@ class MountTableFile : public ::testing::TestWithParam<const char*> {};
 TEST_P(MountTableFile, ReadsWhatFindmntReads)
 {
     const std::string file = kFixtures + "/" + GetParam();
-    const auto ran = LinuxTest::Run({"findmnt", "-F", file, "-J", "-l", "--nofsroot", "-o", "ID,TARGET,SOURCE,FSTYPE,OPTIONS"});
+    const auto ran =
+        LinuxTest::Run({"findmnt", "-F", file, "-J", "-l", "--nofsroot", "-o", "ID,TARGET,SOURCE,FSTYPE,OPTIONS"});
     if (ran.exitCode == 127)
         GTEST_SKIP() << "findmnt is not installed: " << ran.err;
     ASSERT_EQ(ran.exitCode, 0) << ran.err;
@@ -36,8 +37,7 @@ TEST_P(MountTableFile, ReadsWhatFindmntReads)
     }
 }
 
-INSTANTIATE_TEST_SUITE_P(Fixtures, MountTableFile,
-                         ::testing::Values("blanks-and-optional.mountinfo", "nfs.mountinfo"),
+INSTANTIATE_TEST_SUITE_P(Fixtures, MountTableFile, ::testing::Values("blanks-and-optional.mountinfo", "nfs.mountinfo"),
                          [](const auto& info) {
                              std::string name = info.param;
                              return name.substr(0, name.find('.')) == "nfs" ? std::string("Nfs")
@@ -66,19 +66,17 @@ TEST(MountTable, ClassifiesBlockNodevAndNfs)
     for (const auto& e : ReadMountTable(kFixtures + "/nfs.mountinfo"))
         entries.push_back(e);
     const KindCase cases[] = {
-        {"/mnt/my data", MountKind::Block},
-        {"/srv/tab\tand\\slash", MountKind::Block},
-        {"/run/user/0", MountKind::Other},       // tmpfs: nodev
-        {"/mnt/fuse disk", MountKind::Block},    // fuseblk needs a device
-        {"/home/u/remote", MountKind::Other},    // fuse.sshfs: its main type is nodev
-        {"/srv/v3", MountKind::Nfs3},
-        {"/srv/v6", MountKind::Nfs3},
-        {"/srv/v40", MountKind::Nfs4},
-        {"/srv/v42", MountKind::Nfs4},
+        {"/mnt/my data", MountKind::Block},   {"/srv/tab\tand\\slash", MountKind::Block},
+        {"/run/user/0", MountKind::Other},    // tmpfs: nodev
+        {"/mnt/fuse disk", MountKind::Block}, // fuseblk needs a device
+        {"/home/u/remote", MountKind::Other}, // fuse.sshfs: its main type is nodev
+        {"/srv/v3", MountKind::Nfs3},         {"/srv/v6", MountKind::Nfs3},
+        {"/srv/v40", MountKind::Nfs4},        {"/srv/v42", MountKind::Nfs4},
     };
     for (const auto& c : cases) {
         SCOPED_TRACE(c.target);
-        auto it = std::find_if(entries.begin(), entries.end(), [&](const MountEntry& e) { return e.target == c.target; });
+        auto it =
+            std::find_if(entries.begin(), entries.end(), [&](const MountEntry& e) { return e.target == c.target; });
         ASSERT_NE(it, entries.end());
         EXPECT_EQ(Classify(*it, kinds), c.kind);
     }
@@ -110,7 +108,8 @@ TEST(MountTable, NfsOptionsAndServer)
     };
     for (const auto& c : cases) {
         SCOPED_TRACE(c.target);
-        auto it = std::find_if(entries.begin(), entries.end(), [&](const MountEntry& e) { return e.target == c.target; });
+        auto it =
+            std::find_if(entries.begin(), entries.end(), [&](const MountEntry& e) { return e.target == c.target; });
         ASSERT_NE(it, entries.end());
         const NfsOptions nfs = ReadNfsOptions(it->options);
         EXPECT_EQ(nfs.version, c.version);
@@ -136,9 +135,9 @@ TEST(MountTable, NfsOptionEdges)
     const Case cases[] = {
         {"rw,vers=4,minorversion=1", "4.1", 1, false}, // older kernels' spelling
         {"rw,nfsvers=3", "3", 1, false},
-        {"ro,nconnect=junk", "", 1, true},             // junk is not a count
-        {"rw,nconnect=99999999999", "", 1, false},     // neither is an overflow
-        {"rw,errors=remount-ro", "", 1, false},        // "ro" inside another value is not ro
+        {"ro,nconnect=junk", "", 1, true},         // junk is not a count
+        {"rw,nconnect=99999999999", "", 1, false}, // neither is an overflow
+        {"rw,errors=remount-ro", "", 1, false},    // "ro" inside another value is not ro
     };
     for (const auto& c : cases) {
         SCOPED_TRACE(c.options);

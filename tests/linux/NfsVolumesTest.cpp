@@ -29,7 +29,8 @@ TEST(NfsVolumes, AddOnAKernelWithoutNfsClientSaysSoAndRecordsNothing)
         const char* call;
     };
     const Case cases[] = {
-        {{"storage", "nfs", "add", "-H", "10.0.0.1", "-s", "/export", "-v", "v3vol"}, "StorageInfoImpl.AddNetworkFileSystem"},
+        {{"storage", "nfs", "add", "-H", "10.0.0.1", "-s", "/export", "-v", "v3vol"},
+         "StorageInfoImpl.AddNetworkFileSystem"},
         {{"storage", "nfs", "add", "-H", "10.0.0.1", "-s", "/export", "-v", "v3vol", "-c", "4", "-r"},
          "StorageInfoImpl.AddNetworkFileSystem"},
         {{"storage", "nfs41", "add", "-H", "10.0.0.1,10.0.0.2", "-s", "/export", "-v", "v41vol", "-a", "krb5"},
@@ -47,7 +48,7 @@ TEST(NfsVolumes, AddOnAKernelWithoutNfsClientSaysSoAndRecordsNothing)
         EXPECT_NE(lines.find(kNoClient), std::string::npos) << lines;
     }
     // Nothing was recorded, no folder was made for a volume that can never be mounted here.
-    struct stat st{};
+    struct stat st {};
     EXPECT_NE(::stat((dir.Path() + "/state").c_str(), &st), 0);
     const auto listed = LinuxTest::Autocli({"--host", "linux", "--formatter", "json", "storage", "nfs", "list"}, env);
     EXPECT_EQ(listed.exitCode, 0) << listed.err;
@@ -111,9 +112,9 @@ exec 3<&-
 step remove41 "$AUTOCLI" --host linux --formatter json storage nfs41 remove -v vol41
 step registry2 cat "$DIR/linux-host.json"
 )SH";
-    const auto ran = LinuxTest::RunInNamespaces({"-m", "--propagation", "private"}, LinuxTest::kStepFunction + script,
-                                                {"DIR=" + state, "AUTOCLI_LINUX_DIR=" + state,
-                                                 "AUTOCLI_JOURNAL=" + dir.Path() + "/journal"});
+    const auto ran = LinuxTest::RunInNamespaces(
+        {"-m", "--propagation", "private"}, LinuxTest::kStepFunction + script,
+        {"DIR=" + state, "AUTOCLI_LINUX_DIR=" + state, "AUTOCLI_JOURNAL=" + dir.Path() + "/journal"});
     ASSERT_EQ(ran.exitCode, 0) << ran.out << ran.err;
     auto steps = LinuxTest::ParseSteps(ran.out);
 
@@ -171,14 +172,16 @@ step registry2 cat "$DIR/linux-host.json"
     ASSERT_EQ(after.size(), 1u);
     EXPECT_EQ(after[0]["Mounted"], false);
     EXPECT_EQ(nlohmann::json::parse(steps["registry2"].output)["volumes"], nlohmann::json::array());
-    struct stat st{};
+    struct stat st {};
     EXPECT_NE(::stat((state + "/volumes/vol1").c_str(), &st), 0) << "the empty mount point stays behind";
 
     // The journal holds the changes the Linux host was asked for, with their outcome.
     const std::string journal = LinuxTest::ReadFile(dir.Path() + "/journal");
-    for (const char* line : {R"({"call":"FileSystem.Unmount","target":"vol1","args":[0]})",
-                             R"({"call":"StorageInfoImpl.RemoveNetworkFileSystem","target":"vol1","args":["vol1",1]})",
-                             R"({"call":"StorageInfoImpl.RemoveNetworkFileSystem","target":"vol41","args":["vol41",2],"error":"Volume 'vol41' is busy"})"})
+    for (
+        const char* line :
+        {R"({"call":"FileSystem.Unmount","target":"vol1","args":[0]})",
+         R"({"call":"StorageInfoImpl.RemoveNetworkFileSystem","target":"vol1","args":["vol1",1]})",
+         R"({"call":"StorageInfoImpl.RemoveNetworkFileSystem","target":"vol41","args":["vol41",2],"error":"Volume 'vol41' is busy"})"})
         EXPECT_NE(journal.find(line), std::string::npos) << line << "\n" << journal;
 }
 
@@ -194,9 +197,12 @@ TEST(NfsVolumes, NfsGaneshaServerOnLoopback)
     LinuxTest::TempDir dir;
     const std::string exported = dir.Path() + "/export";
     ASSERT_EQ(::mkdir(exported.c_str(), 0755), 0);
-    LinuxTest::WriteFile(dir.Path() + "/ganesha.conf", "NFS_CORE_PARAM { Protocols = 3, 4; Bind_addr = 127.0.0.1; }\n"
-                                                       "EXPORT { Export_Id = 1; Path = " + exported + "; Pseudo = /export;"
-                                                       " Access_Type = RW; Squash = None; FSAL { Name = VFS; } }\n");
+    LinuxTest::WriteFile(dir.Path() + "/ganesha.conf",
+                         "NFS_CORE_PARAM { Protocols = 3, 4; Bind_addr = 127.0.0.1; }\n"
+                         "EXPORT { Export_Id = 1; Path = " +
+                             exported +
+                             "; Pseudo = /export;"
+                             " Access_Type = RW; Squash = None; FSAL { Name = VFS; } }\n");
     const std::string script = R"SH(
 ip link set lo up || exit 20
 rpcbind -w || exit 21
@@ -207,9 +213,9 @@ sleep 3
 "$AUTOCLI" --host linux --formatter json storage nfs remove -v gvol; echo "@@remove $?"
 kill "$(cat "$DIR/ganesha.pid")"
 )SH";
-    const auto ran = LinuxTest::RunInNamespaces({"-m", "-n", "--propagation", "private"}, script,
-                                                {"DIR=" + dir.Path(), "EXPORT=" + exported,
-                                                 "AUTOCLI_LINUX_DIR=" + dir.Path() + "/state"});
+    const auto ran = LinuxTest::RunInNamespaces(
+        {"-m", "-n", "--propagation", "private"}, script,
+        {"DIR=" + dir.Path(), "EXPORT=" + exported, "AUTOCLI_LINUX_DIR=" + dir.Path() + "/state"});
     ASSERT_EQ(ran.exitCode, 0) << ran.out << ran.err;
     EXPECT_NE(ran.out.find("@@add 0"), std::string::npos) << ran.out << ran.err;
     EXPECT_NE(ran.out.find("\"Mounted\": true"), std::string::npos) << ran.out;

@@ -33,7 +33,7 @@ RegisteredVolume Sample()
 
 mode_t ModeOf(const std::string& path)
 {
-    struct stat st{};
+    struct stat st {};
     return ::lstat(path.c_str(), &st) == 0 ? (st.st_mode & 07777) : 0;
 }
 
@@ -55,7 +55,7 @@ TEST(Registry, ReadingAMissingFolderCreatesNothing)
     LinuxTest::TempDir dir;
     Registry registry(dir.Path() + "/not/yet");
     EXPECT_TRUE(registry.Load().empty());
-    struct stat st{};
+    struct stat st {};
     EXPECT_NE(::stat((dir.Path() + "/not").c_str(), &st), 0);
 }
 
@@ -71,7 +71,8 @@ TEST(Registry, SavesEveryFieldAndKeepsTheFileMode)
     ::umask(oldMask);
     EXPECT_EQ(ModeOf(folder + "/linux-host.json"), 0644u);
     EXPECT_EQ(ModeOf(folder + "/linux-host.json.lock"), 0600u);
-    EXPECT_EQ(Names(folder), (std::vector<std::string>{"linux-host.json", "linux-host.json.lock"})); // no temporary left
+    EXPECT_EQ(Names(folder),
+              (std::vector<std::string>{"linux-host.json", "linux-host.json.lock"})); // no temporary left
 
     ASSERT_EQ(::chmod((folder + "/linux-host.json").c_str(), 0640), 0);
     Registry again(folder);
@@ -203,9 +204,16 @@ TEST(Registry, FolderAndVolumeNames)
         bool usable;
     };
     const Case cases[] = {
-        {"datastore1", true}, {"with space", true}, {".hidden", true}, {"", false},
-        {".", false},         {"..", false},        {"a/b", false},    {std::string(255, 'x'), true},
-        {std::string(256, 'x'), false},             {std::string("a\0b", 3), false},
+        {"datastore1", true},
+        {"with space", true},
+        {".hidden", true},
+        {"", false},
+        {".", false},
+        {"..", false},
+        {"a/b", false},
+        {std::string(255, 'x'), true},
+        {std::string(256, 'x'), false},
+        {std::string("a\0b", 3), false},
     };
     for (const auto& c : cases)
         EXPECT_EQ(HostLinux::IsUsableVolumeName(c.name), c.usable) << c.name.size() << ":" << c.name;

@@ -58,7 +58,8 @@ std::vector<Row> FromAutocli(const std::string& json)
     std::vector<Row> rows;
     const auto doc = nlohmann::json::parse(json);
     for (const auto& r : doc)
-        rows.push_back({r["Mount Point"].get<std::string>(), r["Size"].get<std::uint64_t>(), r["Free"].get<std::uint64_t>()});
+        rows.push_back(
+            {r["Mount Point"].get<std::string>(), r["Size"].get<std::uint64_t>(), r["Free"].get<std::uint64_t>()});
     return rows;
 }
 
@@ -95,7 +96,7 @@ TEST(VolumeList, ListsWhatFindmntShowsOnThisMachine)
     ASSERT_FALSE(expected.empty()) << "findmnt shows no block file system: " << shown.out;
     ExpectSameVolumes(expected, FromAutocli(listed.out));
     // A list creates nothing in the registry folder.
-    struct stat st{};
+    struct stat st {};
     EXPECT_NE(::stat((registry.Path() + "/linux-host.json").c_str(), &st), 0);
     EXPECT_NE(::stat((registry.Path() + "/linux-host.json.lock").c_str(), &st), 0);
 }
@@ -121,9 +122,9 @@ mount -o loop "$IMAGE" "$TARGET" || { echo "@@nomount"; exit 0; }
 findmnt -J -b -l -o TARGET,FSTYPE,SIZE,AVAIL; echo "@@findmnt"
 blkid -p -o value -s UUID "$(findmnt -n -o SOURCE "$TARGET")"; echo "@@uuid"
 )SH";
-    const auto ran = LinuxTest::RunInNamespaces({"-m", "--propagation", "private"}, script,
-                                                {"IMAGE=" + image, "TARGET=" + target,
-                                                 "AUTOCLI_LINUX_DIR=" + dir.Path() + "/registry"});
+    const auto ran = LinuxTest::RunInNamespaces(
+        {"-m", "--propagation", "private"}, script,
+        {"IMAGE=" + image, "TARGET=" + target, "AUTOCLI_LINUX_DIR=" + dir.Path() + "/registry"});
     ASSERT_EQ(ran.exitCode, 0) << ran.err;
     if (ran.out.find("@@nomount") != std::string::npos)
         GTEST_SKIP() << "loop devices cannot be mounted here: " << ran.err;

@@ -49,7 +49,8 @@ std::vector<char*> Pointers(std::vector<std::string>& texts)
 
 } // namespace
 
-CliResult RunAutocli(const std::vector<std::string>& args, const std::string& statePath, const std::vector<std::string>& env)
+CliResult RunAutocli(const std::vector<std::string>& args, const std::string& statePath,
+                     const std::vector<std::string>& env)
 {
     std::vector<std::string> argv{AUTOCLI_BINARY};
     if (!statePath.empty()) {

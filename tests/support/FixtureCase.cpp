@@ -35,7 +35,8 @@ std::vector<std::string> SplitShellWords(const std::string& line)
                 if (line[i] == '"') {
                     break;
                 }
-                if (line[i] == '\\' && i + 1 < line.size() && std::string("\"\\$`").find(line[i + 1]) != std::string::npos) {
+                if (line[i] == '\\' && i + 1 < line.size() &&
+                    std::string("\"\\$`").find(line[i + 1]) != std::string::npos) {
                     ++i;
                 }
                 word += line[i];

@@ -67,10 +67,7 @@ std::vector<std::string> ScopedHost::JournalCalls() const
     return calls;
 }
 
-void ScopedHost::ClearJournal()
-{
-    std::ofstream(journalPath_, std::ios::trunc);
-}
+void ScopedHost::ClearJournal() { std::ofstream(journalPath_, std::ios::trunc); }
 
 void ScopedHost::Reopen()
 {

@@ -19,10 +19,10 @@ HostChoice ChooseHost(const Quillets::Cli::GlobalOptions& globals)
     // The state options belong to the simulated host; on this machine they would mean nothing.
     // A dry run works on a state held in memory; this machine has none, so it would change things for real.
     if (choice.useLinux && (globals.statePath || globals.dumpState || globals.initState || globals.dryRun)) {
-        const char* option = globals.statePath    ? "--state"
-                             : globals.dumpState  ? "--dump-state"
-                             : globals.initState  ? "--init-state"
-                                                  : "--dry-run";
+        const char* option = globals.statePath   ? "--state"
+                             : globals.dumpState ? "--dump-state"
+                             : globals.initState ? "--init-state"
+                                                 : "--dry-run";
         choice.error = std::string("Option '") + option + "' cannot be used with the Linux host. See 'autocli --help'.";
     }
     return choice;

@@ -18,11 +18,8 @@ constexpr const char* kMountPoint = "volume-path";
 Quillets::Cli::ValueSources VolumeParameters()
 {
     return {
-        {"volume-label", kLabel},
-        {"volume-uuid", kUuid},
-        {"uuid", kUuid},
-        {"volume-name", kNfsName},
-        {"volume-path", kMountPoint},
+        {"volume-label", kLabel},  {"volume-uuid", kUuid},       {"uuid", kUuid},
+        {"volume-name", kNfsName}, {"volume-path", kMountPoint},
     };
 }
 

@@ -54,7 +54,7 @@ std::optional<std::string> Untrusted(const struct stat& st)
 std::optional<std::string> UntrustedFolder(const std::string& folder)
 {
     for (std::string at = folder;; at = ParentOf(at)) {
-        struct stat st{};
+        struct stat st {};
         if (::stat(at.c_str(), &st) != 0)
             return "'" + at + "' cannot be examined: " + std::strerror(errno);
         if (auto why = Untrusted(st))
@@ -98,7 +98,8 @@ PluginFolder FindPluginFolder()
 }
 
 PluginLoad LoadPlugins(const std::string& folder, const std::shared_ptr<NamespaceNode>& root,
-                       const std::shared_ptr<NamespaceNode>& storage, std::string (*describe)(const std::exception_ptr&))
+                       const std::shared_ptr<NamespaceNode>& storage,
+                       std::string (*describe)(const std::exception_ptr&))
 {
     PluginLoad load;
     const auto realFolder = RealPath(folder);
@@ -127,9 +128,11 @@ PluginLoad LoadPlugins(const std::string& folder, const std::shared_ptr<Namespac
     int loaded = 0;
     for (const auto& name : names) {
         const std::string shown = folder + "/" + name;
-        auto skip = [&](const std::string& why) { load.warnings.push_back("Skipping plug-in '" + shown + "': " + why + "."); };
+        auto skip = [&](const std::string& why) {
+            load.warnings.push_back("Skipping plug-in '" + shown + "': " + why + ".");
+        };
         const auto file = RealPath(*realFolder + "/" + name);
-        struct stat st{};
+        struct stat st {};
         if (!file || ::stat(file->c_str(), &st) != 0) {
             skip(std::string("it cannot be examined: ") + std::strerror(errno));
             continue;

@@ -14,8 +14,8 @@
 namespace AutoCliFrontEnd {
 
 struct PluginFolder {
-    std::string path;  // absolute; empty when `error` is set
-    std::string error; // why there is none
+    std::string path;        // absolute; empty when `error` is set
+    std::string error;       // why there is none
     bool usageError = false; // the error is the user's setting (exit 2), not the installation's
 };
 

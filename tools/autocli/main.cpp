@@ -69,10 +69,7 @@ int Fail(const std::string& message)
     return Quillets::Cli::kExitException;
 }
 
-std::string Describe(const std::exception_ptr& error)
-{
-    return Quillets::Cli::DescribeException(error, Hooks());
-}
+std::string Describe(const std::exception_ptr& error) { return Quillets::Cli::DescribeException(error, Hooks()); }
 
 // A file name as one shell word.
 std::string ShellQuoted(const std::string& text)
@@ -163,7 +160,6 @@ int Run(const std::vector<std::string>& args, std::shared_ptr<NamespaceNode>& tr
         Print(stderr, plugins.error + "\n");
         return plugins.usageError ? Quillets::Cli::kExitUsage : Quillets::Cli::kExitException;
     }
-
 
     // The session comes first: registration reads the host's feature switches.
     try {

@@ -20,10 +20,7 @@ struct ContextFree {
 
 constexpr const char* kTable = "inet autocli";
 
-std::string SetName(Ruleset ruleset, bool v6)
-{
-    return std::string(RulesetName(ruleset)) + (v6 ? "_v6" : "_v4");
-}
+std::string SetName(Ruleset ruleset, bool v6) { return std::string(RulesetName(ruleset)) + (v6 ? "_v6" : "_v4"); }
 
 struct Result {
     bool ok = false;
@@ -66,8 +63,7 @@ std::string ElementText(const nlohmann::json& element)
     if (element.is_object()) {
         if (element.contains("prefix")) {
             const auto& prefix = element["prefix"];
-            return ElementText(prefix.value("addr", nlohmann::json())) + "/" +
-                   std::to_string(prefix.value("len", 0));
+            return ElementText(prefix.value("addr", nlohmann::json())) + "/" + std::to_string(prefix.value("len", 0));
         }
         if (element.contains("range") && element["range"].is_array() && element["range"].size() == 2)
             return ElementText(element["range"][0]) + "-" + ElementText(element["range"][1]);
@@ -83,14 +79,18 @@ void EnsureTable()
     const Result existing = Run(std::string("list chain ") + kTable + " nfs_client_out", false);
     std::string commands = std::string("add table ") + kTable + "\n";
     for (Ruleset r : {Ruleset::NfsClient, Ruleset::Nfs41Client}) {
-        commands += "add set " + std::string(kTable) + " " + SetName(r, false) + " { type ipv4_addr; flags interval; }\n";
-        commands += "add set " + std::string(kTable) + " " + SetName(r, true) + " { type ipv6_addr; flags interval; }\n";
+        commands +=
+            "add set " + std::string(kTable) + " " + SetName(r, false) + " { type ipv4_addr; flags interval; }\n";
+        commands +=
+            "add set " + std::string(kTable) + " " + SetName(r, true) + " { type ipv6_addr; flags interval; }\n";
     }
     if (!existing.ok) {
         const std::string t = kTable;
         commands += "add chain " + t + " nfs_client_out { type filter hook output priority 0; policy accept; }\n";
-        commands += "add rule " + t + " nfs_client_out ip daddr @nfsClient_v4 meta l4proto { tcp, udp } th dport { 111, 2049 } accept\n";
-        commands += "add rule " + t + " nfs_client_out ip6 daddr @nfsClient_v6 meta l4proto { tcp, udp } th dport { 111, 2049 } accept\n";
+        commands += "add rule " + t +
+                    " nfs_client_out ip daddr @nfsClient_v4 meta l4proto { tcp, udp } th dport { 111, 2049 } accept\n";
+        commands += "add rule " + t +
+                    " nfs_client_out ip6 daddr @nfsClient_v6 meta l4proto { tcp, udp } th dport { 111, 2049 } accept\n";
         commands += "add rule " + t + " nfs_client_out ip daddr @nfs41Client_v4 tcp dport 2049 accept\n";
         commands += "add rule " + t + " nfs_client_out ip6 daddr @nfs41Client_v6 tcp dport 2049 accept\n";
     }
@@ -113,10 +113,7 @@ std::vector<std::string> ListSet(const std::string& set)
 
 } // namespace
 
-const char* RulesetName(Ruleset ruleset)
-{
-    return ruleset == Ruleset::NfsClient ? "nfsClient" : "nfs41Client";
-}
+const char* RulesetName(Ruleset ruleset) { return ruleset == Ruleset::NfsClient ? "nfsClient" : "nfs41Client"; }
 
 bool NormaliseNetwork(const std::string& input, Network& out)
 {
@@ -185,9 +182,8 @@ void AddToRuleset(Ruleset ruleset, const std::string& input)
     if (std::find(present.begin(), present.end(), network.text) != present.end())
         throw std::runtime_error("IP/Mask '" + input + "' already exists in ruleset " + RulesetName(ruleset));
     EnsureTable();
-    const Result added =
-        Run("add element " + std::string(kTable) + " " + SetName(ruleset, network.v6) + " { " + network.text + " }",
-            false);
+    const Result added = Run(
+        "add element " + std::string(kTable) + " " + SetName(ruleset, network.v6) + " { " + network.text + " }", false);
     if (!added.ok)
         throw std::runtime_error("Cannot add IP/Mask '" + input + "' to ruleset " + RulesetName(ruleset) + ": " +
                                  Reason(added));
@@ -202,12 +198,12 @@ void RemoveFromRuleset(Ruleset ruleset, const std::string& input)
     const auto present = ListRuleset(ruleset);
     if (std::find(present.begin(), present.end(), network.text) == present.end())
         throw std::runtime_error(notFound);
-    const Result removed = Run(
-        "delete element " + std::string(kTable) + " " + SetName(ruleset, network.v6) + " { " + network.text + " }",
-        false);
+    const Result removed =
+        Run("delete element " + std::string(kTable) + " " + SetName(ruleset, network.v6) + " { " + network.text + " }",
+            false);
     if (!removed.ok)
-        throw std::runtime_error("Cannot remove IP/Mask '" + input + "' from ruleset " + RulesetName(ruleset) +
-                                 ": " + Reason(removed));
+        throw std::runtime_error("Cannot remove IP/Mask '" + input + "' from ruleset " + RulesetName(ruleset) + ": " +
+                                 Reason(removed));
 }
 
 } // namespace HostLinux

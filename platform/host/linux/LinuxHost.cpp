@@ -111,14 +111,15 @@ void Measure(Volume& v)
     try {
         v.capacity = StatWithin(v.mountPoint, kStatSeconds);
         if (!v.capacity)
-            v.capacityError = "'" + v.mountPoint + "' did not answer within " + std::to_string(kStatSeconds) + " seconds";
+            v.capacityError =
+                "'" + v.mountPoint + "' did not answer within " + std::to_string(kStatSeconds) + " seconds";
     } catch (const std::exception& e) {
         v.capacityError = "Cannot read the size of '" + v.mountPoint + "': " + e.what();
     }
 }
 
 struct Scan {
-    std::vector<VolumePtr> mounted;      // block and NFS mounts, in mount table order
+    std::vector<VolumePtr> mounted;        // block and NFS mounts, in mount table order
     std::vector<VolumePtr> registeredOnly; // registered volumes the mounted list does not show
 };
 
@@ -220,7 +221,8 @@ std::vector<VolumePtr> Everything(const Scan& scan)
 
 std::string NotAddedHere(const Volume& v)
 {
-    return "Volume '" + v.volumeName + "' was not added with autocli; on a Linux host only the NFS volumes added "
+    return "Volume '" + v.volumeName +
+           "' was not added with autocli; on a Linux host only the NFS volumes added "
            "with autocli are mounted, changed or unmounted through it";
 }
 
@@ -444,9 +446,10 @@ public:
             // not stay behind as if the add had worked.
             if (volume().freshlyAdded && !volume().mounted)
                 TheRegistry().Update([&](std::vector<RegisteredVolume>& volumes) {
-                    volumes.erase(std::remove_if(volumes.begin(), volumes.end(),
-                                                 [&](const RegisteredVolume& r) { return r.name == volume().volumeName; }),
-                                  volumes.end());
+                    volumes.erase(
+                        std::remove_if(volumes.begin(), volumes.end(),
+                                       [&](const RegisteredVolume& r) { return r.name == volume().volumeName; }),
+                        volumes.end());
                 });
             NotAvailable("NetworkFileSystem.SetPE");
         });
@@ -614,10 +617,7 @@ void CloseSession()
 
 bool Active() { return gActive; }
 
-void NotAvailable(const std::string& call)
-{
-    throw HostCtlException(call + " is not available on a Linux host");
-}
+void NotAvailable(const std::string& call) { throw HostCtlException(call + " is not available on a Linux host"); }
 
 namespace Storage {
 
@@ -716,8 +716,9 @@ namespace {
 std::unique_ptr<NetworkFileSystem> Register(RegisteredVolume reg)
 {
     if (!IsUsableVolumeName(reg.name))
-        throw std::runtime_error("Volume name '" + reg.name +
-                                 "' cannot be used on a Linux host: it must be a folder name (no '/', not '.' or '..')");
+        throw std::runtime_error(
+            "Volume name '" + reg.name +
+            "' cannot be used on a Linux host: it must be a folder name (no '/', not '.' or '..')");
     if (reg.hosts.empty() || reg.hosts.front().empty())
         throw std::runtime_error("NFS volume '" + reg.name + "' needs a server");
     // A volume that could never be mounted here is not recorded at all.
@@ -761,8 +762,7 @@ std::unique_ptr<NetworkFileSystem> AddNetworkFileSystem(const std::string& host,
 
 std::unique_ptr<NetworkFileSystem> AddV41NetworkFileSystem(const std::vector<std::string>& hosts,
                                                            const std::string& share, const std::string& volumeName,
-                                                           NetworkFileSystem::SecurityType security,
-                                                           bool knxnicBound)
+                                                           NetworkFileSystem::SecurityType security, bool knxnicBound)
 {
     const Journal journal{volumeName, J::array({hosts, share, volumeName, static_cast<int>(security), knxnicBound})};
     return Call("StorageInfoImpl.AddV41NetworkFileSystem", &journal, [&] {
@@ -805,18 +805,18 @@ std::vector<std::unique_ptr<NetworkFileSystem>> GetNetworkFileSystems(bool v41, 
 {
     return Call(v41 ? "StorageInfoImpl.GetV41NetworkFileSystems" : "StorageInfoImpl.GetV3NetworkFileSystems", nullptr,
                 [&] {
-        std::vector<std::unique_ptr<NetworkFileSystem>> result;
-        for (const auto& v : Everything(Look())) {
-            const bool wanted = v->registered ? v->registered->v41 == v41
-                                              : (v41 ? v->type == "NFS41" : v->kind == MountKind::Nfs3);
-            if (!wanted)
-                continue;
-            auto object = std::make_unique<LinuxNetworkFileSystem>(v);
-            if (!filter || filter(*object))
-                result.push_back(std::move(object));
-        }
-        return result;
-    });
+                    std::vector<std::unique_ptr<NetworkFileSystem>> result;
+                    for (const auto& v : Everything(Look())) {
+                        const bool wanted = v->registered ? v->registered->v41 == v41
+                                                          : (v41 ? v->type == "NFS41" : v->kind == MountKind::Nfs3);
+                        if (!wanted)
+                            continue;
+                        auto object = std::make_unique<LinuxNetworkFileSystem>(v);
+                        if (!filter || filter(*object))
+                            result.push_back(std::move(object));
+                    }
+                    return result;
+                });
 }
 
 void PreUnmount(const std::string& call, const std::string& volumeName)
@@ -847,7 +847,8 @@ std::vector<std::string> GetNasFirewallConfigs(NfsVersion version)
 void OpenHlfs(const std::string& path)
 {
     const Journal journal{"", J::array({path})};
-    Call("HlFileSystemImpl.new", &journal, [&] { throw HostCtlException("Cannot open HLFS volume at '" + path + "'"); });
+    Call("HlFileSystemImpl.new", &journal,
+         [&] { throw HostCtlException("Cannot open HLFS volume at '" + path + "'"); });
 }
 
 HostCtl::Host* GetHost()

@@ -49,8 +49,7 @@ std::unique_ptr<NetworkFileSystem> AddNetworkFileSystem(const std::string& host,
                                                         std::int64_t connections);
 std::unique_ptr<NetworkFileSystem> AddV41NetworkFileSystem(const std::vector<std::string>& hosts,
                                                            const std::string& share, const std::string& volumeName,
-                                                           NetworkFileSystem::SecurityType security,
-                                                           bool knxnicBound);
+                                                           NetworkFileSystem::SecurityType security, bool knxnicBound);
 // `version` 0: either version.
 void RemoveNetworkFileSystem(const std::string& volumeName, int version);
 std::vector<std::unique_ptr<NetworkFileSystem>> GetNetworkFileSystems(bool v41, NfsFilter filter);

@@ -26,8 +26,8 @@ int OpenFolderAt(int parent, const std::string& name, const std::string& shown)
         throw std::runtime_error("Cannot create folder '" + shown + "': " + Errno());
     const int fd = ::openat(parent, name.c_str(), O_PATH | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC);
     if (fd < 0)
-        throw std::runtime_error("Cannot open folder '" + shown + "': " +
-                                 (errno == ELOOP || errno == ENOTDIR ? std::string("not a folder") : Errno()));
+        throw std::runtime_error("Cannot open folder '" + shown +
+                                 "': " + (errno == ELOOP || errno == ENOTDIR ? std::string("not a folder") : Errno()));
     return fd;
 }
 
@@ -43,7 +43,7 @@ void RequireNfsClient(const FilesystemKinds& kinds, bool v41)
 
 int OpenMountPoint(const std::string& folder, const std::string& name)
 {
-    struct stat st{};
+    struct stat st {};
     if (::stat(folder.c_str(), &st) != 0 && errno == ENOENT && ::mkdir(folder.c_str(), 0755) != 0 && errno != EEXIST)
         throw std::runtime_error("Cannot create folder '" + folder + "': " + Errno());
     const int top = ::open(folder.c_str(), O_PATH | O_DIRECTORY | O_CLOEXEC);
@@ -67,8 +67,7 @@ int OpenMountPoint(const std::string& folder, const std::string& name)
     }
 }
 
-void MountOnto(int fd, const std::string& source, const std::string& type, unsigned long flags,
-               const std::string& data)
+void MountOnto(int fd, const std::string& source, const std::string& type, unsigned long flags, const std::string& data)
 {
     const std::string target = "/proc/self/fd/" + std::to_string(fd);
     if (::mount(source.c_str(), target.c_str(), type.c_str(), flags, data.empty() ? nullptr : data.c_str()) != 0)

@@ -173,11 +173,11 @@ std::optional<Capacity> StatWithin(const std::string& path, int seconds)
         std::condition_variable done;
         bool finished = false;
         int error = 0;
-        struct statvfs st{};
+        struct statvfs st {};
     };
     auto shared = std::make_shared<Shared>();
     std::thread worker([shared, path] {
-        struct statvfs st{};
+        struct statvfs st {};
         const int rc = ::statvfs(path.c_str(), &st);
         const int error = rc == 0 ? 0 : errno;
         std::lock_guard<std::mutex> lock(shared->mutex);
@@ -204,7 +204,7 @@ std::optional<Capacity> StatWithin(const std::string& path, int seconds)
 Identity ProbeDevice(const std::string& source)
 {
     Identity identity;
-    struct stat st{};
+    struct stat st {};
     if (source.rfind("/dev/", 0) != 0 || ::stat(source.c_str(), &st) != 0 || !S_ISBLK(st.st_mode))
         return identity;
     // The low-level probe reads the superblock only; it writes no cache.

@@ -43,7 +43,7 @@ struct NfsOptions {
     std::int64_t connections = 1; // nconnect
     std::uint32_t rsize = 0;
     std::uint32_t wsize = 0;
-    std::string security;         // sec=, "" when not given
+    std::string security; // sec=, "" when not given
     bool readOnly = false;
 };
 NfsOptions ReadNfsOptions(const std::string& options);

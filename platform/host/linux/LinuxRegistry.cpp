@@ -32,7 +32,7 @@ std::string ParentOf(const std::string& path)
 // mkdir -p for the registry folder; only root-owned-style permissions (0755).
 void MakeFolders(const std::string& dir)
 {
-    struct stat st{};
+    struct stat st {};
     if (::stat(dir.c_str(), &st) == 0) {
         if (!S_ISDIR(st.st_mode))
             throw std::runtime_error("'" + dir + "' is not a folder");
@@ -98,14 +98,10 @@ RegisteredVolume FromJson(const nlohmann::json& item)
 
 nlohmann::ordered_json ToJson(const RegisteredVolume& v)
 {
-    return {{"name", v.name},
-            {"version", v.v41 ? "4.1" : "3"},
-            {"hosts", v.hosts},
-            {"share", v.share},
-            {"readOnly", v.readOnly},
-            {"connections", v.connections},
-            {"security", v.security},
-            {"explicitlyUnmounted", v.explicitlyUnmounted}};
+    return {{"name", v.name},         {"version", v.v41 ? "4.1" : "3"},
+            {"hosts", v.hosts},       {"share", v.share},
+            {"readOnly", v.readOnly}, {"connections", v.connections},
+            {"security", v.security}, {"explicitlyUnmounted", v.explicitlyUnmounted}};
 }
 
 // Reads the whole of an open file.
@@ -152,8 +148,8 @@ std::vector<RegisteredVolume> Parse(const std::string& text, const std::string& 
 
 bool IsUsableVolumeName(const std::string& name)
 {
-    return !name.empty() && name.size() <= 255 && name != "." && name != ".." &&
-           name.find('/') == std::string::npos && name.find('\0') == std::string::npos;
+    return !name.empty() && name.size() <= 255 && name != "." && name != ".." && name.find('/') == std::string::npos &&
+           name.find('\0') == std::string::npos;
 }
 
 std::string Registry::DefaultFolder()
@@ -196,7 +192,7 @@ std::vector<RegisteredVolume> Registry::Load() const
             return {};
         throw std::runtime_error("Cannot read registry file '" + FilePath() + "': " + std::strerror(openError));
     }
-    struct stat st{};
+    struct stat st {};
     if (::fstat(fd, &st) != 0 || !S_ISREG(st.st_mode)) {
         ::close(fd);
         throw std::runtime_error("Registry file '" + FilePath() + "' is not a regular file");
@@ -259,7 +255,7 @@ void Registry::Save(const std::vector<RegisteredVolume>& volumes)
         ::unlinkat(folderFd_, tempName.c_str(), 0);
         throw std::runtime_error("Cannot save registry file '" + file + "': " + why);
     };
-    struct stat old{};
+    struct stat old {};
     const mode_t mode = ::fstatat(folderFd_, kFileName, &old, AT_SYMLINK_NOFOLLOW) == 0 && S_ISREG(old.st_mode)
                             ? (old.st_mode & 07777)
                             : 0644;
