@@ -115,7 +115,7 @@ void WriteIndented(const ojson& value, const char* indent)
 
 } // namespace
 
-int main(int argc, char** argv)
+static int Generate(int argc, char** argv)
 {
     const bool hlfsOnly = argc == 3 && std::string(argv[1]) == "--hlfs";
     const char* number = argc == 2 ? argv[1] : (hlfsOnly ? argv[2] : nullptr);
@@ -140,4 +140,14 @@ int main(int argc, char** argv)
     WriteIndented({{"nfsClient", {"10.0.0.0/8"}}, {"nfs41Client", {"10.30.0.0/16"}}}, "  ");
     std::cout << "\n}\n";
     return std::cout ? 0 : 1;
+}
+
+int main(int argc, char** argv)
+{
+    try {
+        return Generate(argc, argv);
+    } catch (const std::exception& e) {
+        std::cerr << "make-state: " << e.what() << "\n";
+        return 1;
+    }
 }

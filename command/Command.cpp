@@ -109,9 +109,8 @@ void NotifyDatastore(const std::string& event, const std::string& data)
 {
     const std::string command = std::string(kNotifyScript) + " -t " + event + " -i " + "stdin";
     std::string output;
-    const std::string input = data;
     // The script's outcome does not change what the caller does next.
-    (void)Quillets::AutoCli::AutoCli_ShellCmd(command, output, input);
+    (void)Quillets::AutoCli::AutoCli_ShellCmd(command, output, data);
 }
 
 std::shared_ptr<OutputSpec> StructOutputSpec(std::shared_ptr<MetaStruct> structure)

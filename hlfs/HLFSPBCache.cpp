@@ -8,7 +8,6 @@ namespace OrvaneCli::FileSystem {
 
 using HostCtl::HeapRecord;
 using HostCtl::HostFactory;
-using HostCtl::Misc::StrCat;
 using HostCtl::Storage::PointerBlockCacheStats;
 
 namespace {

@@ -34,8 +34,10 @@ NamespacePtr FindNamespace(const NodePtr& parent, const char* name)
 
 extern "C" {
 
+// NOLINTNEXTLINE(performance-unnecessary-value-param): the exported signature is fixed
 void AutoCli_RegisterNamespaces(std::shared_ptr<NamespaceNode> root) { Core_RegisterInternalNamespaces(root); }
 
+// NOLINTNEXTLINE(performance-unnecessary-value-param): the exported signature is fixed
 void Core_RegisterInternalNamespaces(std::shared_ptr<NamespaceNode> root)
 {
     const NamespacePtr storage = FindNamespace(root, "storage");
@@ -51,13 +53,16 @@ void Core_RegisterInternalNamespaces(std::shared_ptr<NamespaceNode> root)
     ClusteredHdsk_RegisterInternalNamespace(internal);
 }
 
+// NOLINTNEXTLINE(performance-unnecessary-value-param): the exported signature is fixed
 void Nmp_RegisterInternalNamespaces(std::shared_ptr<NamespaceNode> parent) { Attach(parent, "nmp", NmpNamespace()); }
 
+// NOLINTNEXTLINE(performance-unnecessary-value-param): the exported signature is fixed
 void ClusteredHdsk_RegisterInternalNamespace(std::shared_ptr<NamespaceNode> parent)
 {
     Attach(parent, "clusteredhdsk", ClusteredHdskNamespace());
 }
 
+// NOLINTNEXTLINE(performance-unnecessary-value-param): the exported signature is fixed
 void FilesystemNfs_RegisterNamespaces(std::shared_ptr<NamespaceNode> parent)
 {
     Attach(parent, "filesystem", FilesystemNamespace());

@@ -180,7 +180,7 @@ std::size_t EscapedWidth(std::string_view text)
         const auto c = NextCodePoint(text, pos);
         if (c && !IsControl(*c)) {
             width += measure.Columns(*c);
-        } else if (c == U'\n' || c == U'\t' || c == U'\r') {
+        } else if (c && (*c == U'\n' || *c == U'\t' || *c == U'\r')) {
             width += 2;
         } else {
             width += kHexEscapeWidth * (pos - start);

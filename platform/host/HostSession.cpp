@@ -38,8 +38,6 @@ namespace HostSim {
 
 namespace {
 
-using Runtime::Throw;
-
 constexpr int kFeatureIndexes[4] = {102, 103, 104, 270};
 unsigned char gFeatureBytes[4] = {};
 
@@ -448,8 +446,9 @@ struct FileIdentity {
 void WriteAtomically(int dirFd, const std::string& base, const Model::State& state, const FileIdentity& identity,
                      bool noReplace)
 {
-    auto [folderName, folderFd] = MakePrivateFolder(dirFd, base);
-    Fd folder(folderFd);
+    auto made = MakePrivateFolder(dirFd, base);
+    const std::string folderName = std::move(made.first);
+    Fd folder(made.second);
     const char* const kFile = "state";
     bool fileMade = false;
     auto cleanUp = [&] {

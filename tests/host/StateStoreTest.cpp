@@ -105,7 +105,7 @@ struct stat Lstat(const std::string& path)
 
 std::string InitState(const Folder& folder, const std::string& name = "host.json")
 {
-    const std::string path = folder / name;
+    std::string path = folder / name;
     const auto made = RunAutocli({"--state", path, "--init-state"}, "", folder.Env());
     if (made.exitCode != 0)
         throw std::runtime_error("--init-state failed: " + made.err);

@@ -17,9 +17,9 @@ struct Ran {
     std::string err;
 };
 
-// Runs `argv` (argv[0] looked up in PATH) with no standard input; `env` adds or replaces
+// Runs `args` (args[0] looked up in PATH) with no standard input; `env` adds or replaces
 // "NAME=VALUE" entries.
-Ran Run(const std::vector<std::string>& argv, const std::vector<std::string>& env = {});
+Ran Run(const std::vector<std::string>& args, const std::vector<std::string>& env = {});
 
 // Runs autocli with `args`.
 Ran Autocli(const std::vector<std::string>& args, const std::vector<std::string>& env = {});

@@ -34,7 +34,7 @@ void ExpectInNamespace(const std::function<std::string()>& body)
 TEST(MountOps, MountAndUnmountAStandIn)
 {
     LinuxTest::TempDir dir;
-    const std::string folder = dir.Path();
+    const std::string& folder = dir.Path();
     ExpectInNamespace([&]() -> std::string {
         const int fd = OpenMountPoint(folder, "vol one");
         MountOnto(fd, "standin", "tmpfs", 0, "size=1m");
@@ -67,7 +67,7 @@ TEST(MountOps, MountAndUnmountAStandIn)
 TEST(MountOps, LinksInTheWayAreRefused)
 {
     LinuxTest::TempDir dir;
-    const std::string folder = dir.Path();
+    const std::string& folder = dir.Path();
     const std::string elsewhere = folder + "/elsewhere";
     ASSERT_EQ(::mkdir(elsewhere.c_str(), 0755), 0);
     struct Case {

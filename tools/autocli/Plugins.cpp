@@ -82,6 +82,7 @@ PluginFolder FindPluginFolder()
     // that is absolute. Never from the current folder.
     std::optional<std::string> self = RealPath("/proc/self/exe");
     if (!self) {
+        // NOLINTNEXTLINE(performance-no-int-to-ptr): the loader hands the address over as an integer
         const char* started = reinterpret_cast<const char*>(::getauxval(AT_EXECFN));
         if (started && started[0] == '/')
             self = RealPath(started);

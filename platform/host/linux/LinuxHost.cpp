@@ -55,10 +55,10 @@ auto Call(std::string_view call, const Journal* journal, F&& body) -> decltype(b
             HostSim::Runtime::WriteJournal(call, *journal, &e.message);
         throw;
     } catch (const std::exception& e) {
-        HostCtlException error(e.what());
+        const std::string message = e.what();
         if (journal)
-            HostSim::Runtime::WriteJournal(call, *journal, &error.message);
-        throw error;
+            HostSim::Runtime::WriteJournal(call, *journal, &message);
+        throw HostCtlException(message);
     }
 }
 
