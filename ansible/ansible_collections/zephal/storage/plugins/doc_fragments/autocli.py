@@ -1,5 +1,5 @@
 # -*- coding: utf-8 -*-
-# Options every module of the collection shares: which autocli runs, on which state.
+# What every module of the collection shares: its origin, and which autocli runs, on which state.
 
 from __future__ import absolute_import, division, print_function
 
@@ -8,6 +8,9 @@ __metaclass__ = type
 
 class ModuleDocFragment(object):
     DOCUMENTATION = r'''
+version_added: 1.0.0
+author:
+  - Zephal storage team
 options:
   autocli_path:
     description:

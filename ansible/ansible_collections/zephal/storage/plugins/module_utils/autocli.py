@@ -50,6 +50,21 @@ def check_list_entries(module, option, entries):
             module.fail_json(msg="%s: '%s' is not a single entry (no commas or blanks, not empty)" % (option, entry))
 
 
+def find_volume(cli, label=None, uuid=None):
+    """The volume of that label or UUID as filesystem list shows it (any kind), or None. Of several
+    volumes with one label, the first, as the host's own look-up picks it."""
+    for row in cli.query('storage', 'filesystem', 'list') or []:
+        if (label is not None and row.get('Volume Name') == label) or (uuid is not None and row.get('UUID') == uuid):
+            return row
+    return None
+
+
+def rule_set(cli, namespace):
+    """The entries of an NFS client rule set ('nfs' or 'nfs41'), in the host's order."""
+    listed = cli.query('storage', namespace, 'firewall', 'list') or {}
+    return split_list(listed.get('Allowed IPMask', ''))
+
+
 class Autocli:
     """Runs autocli with the host's options and the json formatter, never through a shell."""
 
@@ -140,3 +155,10 @@ class Autocli:
         if self.module.check_mode:
             values['host_calls'] = self.host_calls
         return values
+
+    def exit(self, diff, **values):
+        """Ends the task with the result; diff (a dict with before and after) shows in diff mode."""
+        result = self.result(**values)
+        if self.module._diff:
+            result['diff'] = diff
+        self.module.exit_json(**result)

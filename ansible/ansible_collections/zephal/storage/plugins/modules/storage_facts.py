@@ -15,9 +15,6 @@ description:
     modes and the space reclamation settings of each HLFS volume.
   - Each row's keys are autocli's field titles in lower case, with every run of other characters
     than letters and digits made one C(_) (C(Volume Name) is C(volume_name), C(Host(s)) is C(host_s)).
-version_added: 1.0.0
-author:
-  - Zephal storage team
 extends_documentation_fragment:
   - zephal.storage.autocli
 options:
@@ -96,18 +93,13 @@ ansible_facts:
 
 from ansible.module_utils.basic import AnsibleModule
 from ansible_collections.zephal.storage.plugins.module_utils.autocli import (
-    Autocli, argument_spec, fact_row, split_list)
+    Autocli, argument_spec, fact_row, rule_set)
 
 PARTS = ['volumes', 'nfs', 'nfs41', 'firewall', 'lockmodes', 'reclaim']
 
 
 def rows(cli, *args):
     return [fact_row(row) for row in cli.query(*args) or []]
-
-
-def rule_set(cli, namespace):
-    listed = cli.query('storage', namespace, 'firewall', 'list') or {}
-    return split_list(listed.get('Allowed IPMask', ''))
 
 
 def reclaim_settings(cli, volumes):

@@ -14,11 +14,9 @@ description:
     C(autocli storage filesystem mount) or C(autocli storage filesystem unmount) on the managed
     host, when the volume list shows it in the other state.
   - A volume the host does not have fails the task with autocli's own message.
-version_added: 1.0.0
-author:
-  - Zephal storage team
 extends_documentation_fragment:
   - zephal.storage.autocli
+  - zephal.storage.changes
 options:
   label:
     description:
@@ -42,8 +40,6 @@ options:
       - Only used when the volume is mounted or unmounted by this task.
     type: bool
     default: true
-notes:
-  - Supports check mode (through C(autocli --dry-run)) and diff mode.
 '''
 
 EXAMPLES = r'''
@@ -66,28 +62,11 @@ volume:
   sample: {volume_name: shared-ds01, uuid: 5f8d2b02-91a0c3e5-4d21-001e67c4d2a8, type: HLFS-5,
            mounted: true, mount_point: /hlfs/volumes/5f8d2b02-91a0c3e5-4d21-001e67c4d2a8,
            size: 2198754820096, free: 879340866765}
-commands:
-  description: The autocli commands run that change the host (with C(--dry-run) in check mode).
-  returned: always
-  type: list
-  elements: list
-host_calls:
-  description: In check mode, the host calls the dry run reported, one entry per call.
-  returned: in check mode
-  type: list
-  elements: raw
 '''
 
 from ansible.module_utils.basic import AnsibleModule
-from ansible_collections.zephal.storage.plugins.module_utils.autocli import Autocli, argument_spec, fact_row
-
-
-def find_volume(cli, label, uuid):
-    # The first volume of that label, as the host's own look-up picks it.
-    for row in cli.query('storage', 'filesystem', 'list') or []:
-        if (label is not None and row.get('Volume Name') == label) or (uuid is not None and row.get('UUID') == uuid):
-            return row
-    return None
+from ansible_collections.zephal.storage.plugins.module_utils.autocli import (
+    Autocli, argument_spec, fact_row, find_volume)
 
 
 def main():
@@ -124,12 +103,8 @@ def main():
         volume = find_volume(cli, label, uuid) or volume
     elif cli.changed:
         volume = dict(volume, Mounted=mount)
-    result = cli.result()
-    if volume:
-        result['volume'] = fact_row(volume)
-    if module._diff:
-        result['diff'] = dict(before=before, after=after)
-    module.exit_json(**result)
+    shown = dict(volume=fact_row(volume)) if volume else {}
+    cli.exit(dict(before=before, after=after), **shown)
 
 
 if __name__ == '__main__':

@@ -15,11 +15,9 @@ description:
   - When a volume of that name exists with other settings, the task reports the difference and
     fails, unless C(replace) is set; then the volume is removed and added again.
   - A present volume that is not mounted is mounted.
-version_added: 1.0.0
-author:
-  - Zephal storage team
 extends_documentation_fragment:
   - zephal.storage.autocli
+  - zephal.storage.changes
 options:
   name:
     description:
@@ -76,7 +74,6 @@ options:
     type: bool
     default: false
 notes:
-  - Supports check mode (through C(autocli --dry-run)) and diff mode.
   - Servers bound to a named network interface are not handled by this module.
 '''
 
@@ -123,35 +120,17 @@ differences:
   returned: when the volume existed with other settings
   type: dict
   sample: {share: {before: /exports/iso, after: /exports/iso-2024}}
-commands:
-  description: The autocli commands run that change the host (with C(--dry-run) in check mode).
-  returned: always
-  type: list
-  elements: list
-host_calls:
-  description: In check mode, the host calls the dry runs reported, one entry per call.
-  returned: in check mode
-  type: list
-  elements: raw
 '''
 
 from ansible.module_utils.basic import AnsibleModule
 from ansible_collections.zephal.storage.plugins.module_utils.autocli import (
-    Autocli, argument_spec, check_list_entries, split_list)
+    Autocli, argument_spec, check_list_entries, find_volume, split_list)
 
 # Per version: the command namespace and the type filesystem list shows.
 VERSIONS = {
     '3': dict(namespace='nfs', type='NFS'),
     '4.1': dict(namespace='nfs41', type='NFS41'),
 }
-
-
-def find_volume(cli, name):
-    """The volume of that name as filesystem list shows it (any kind), or None."""
-    for row in cli.query('storage', 'filesystem', 'list') or []:
-        if row.get('Volume Name') == name:
-            return row
-    return None
 
 
 def version_of(volume_type):
@@ -306,12 +285,8 @@ def main():
 def finish(module, cli, before, after, found=None):
     if cli.changed and not module.check_mode and after is not None:
         after = read_settings(cli, after['name'], after['version']) or after
-    result = cli.result(volume=after or {})
-    if found:
-        result['differences'] = found
-    if module._diff:
-        result['diff'] = dict(before=before or {}, after=after or {})
-    module.exit_json(**result)
+    shown = dict(differences=found) if found else {}
+    cli.exit(dict(before=before or {}, after=after or {}), volume=after or {}, **shown)
 
 
 if __name__ == '__main__':

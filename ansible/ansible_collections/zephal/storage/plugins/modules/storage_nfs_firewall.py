@@ -13,11 +13,9 @@ description:
   - Adds or removes IP/Mask entries of the NFS v3 (C(nfsClient)) or NFS v4.1 (C(nfs41Client))
     client rule set by running C(autocli storage nfs firewall ...) or
     C(autocli storage nfs41 firewall ...) on the managed host.
-version_added: 1.0.0
-author:
-  - Zephal storage team
 extends_documentation_fragment:
   - zephal.storage.autocli
+  - zephal.storage.changes
 options:
   version:
     description:
@@ -41,7 +39,6 @@ options:
     choices: [present, absent, exact]
     default: present
 notes:
-  - Supports check mode (through C(autocli --dry-run)) and diff mode.
   - A host that stores entries in a normal form (a network address for a mask) lists them that
     way; give them in that form, or every run adds them again.
 '''
@@ -80,21 +77,11 @@ removed:
   returned: always
   type: list
   elements: str
-commands:
-  description: The autocli commands run that change the host (with C(--dry-run) in check mode).
-  returned: always
-  type: list
-  elements: list
-host_calls:
-  description: In check mode, the host calls the dry runs reported, one entry per call.
-  returned: in check mode
-  type: list
-  elements: raw
 '''
 
 from ansible.module_utils.basic import AnsibleModule
 from ansible_collections.zephal.storage.plugins.module_utils.autocli import (
-    Autocli, argument_spec, check_list_entries, split_list)
+    Autocli, argument_spec, check_list_entries, rule_set)
 
 NAMESPACES = {'3': 'nfs', '4.1': 'nfs41'}
 
@@ -119,8 +106,7 @@ def main():
     namespace = NAMESPACES[params['version']]
     cli = Autocli(module)
 
-    listed = cli.query('storage', namespace, 'firewall', 'list') or {}
-    before = split_list(listed.get('Allowed IPMask', ''))
+    before = rule_set(cli, namespace)
 
     state = params['state']
     to_add = [e for e in wanted if e not in before] if state != 'absent' else []
@@ -138,15 +124,11 @@ def main():
 
     after = [e for e in before if e not in to_remove] + to_add
     if cli.changed and not module.check_mode:
-        listed = cli.query('storage', namespace, 'firewall', 'list') or {}
-        after = split_list(listed.get('Allowed IPMask', ''))
+        after = rule_set(cli, namespace)
 
-    result = cli.result(entries=after, added=to_add, removed=to_remove)
-    if module._diff:
-        result['diff'] = dict(before=''.join(e + '\n' for e in before), after=''.join(e + '\n' for e in after),
-                              before_header='%s client rule set' % namespace,
-                              after_header='%s client rule set' % namespace)
-    module.exit_json(**result)
+    cli.exit(dict(before=''.join(e + '\n' for e in before), after=''.join(e + '\n' for e in after),
+                  before_header='%s client rule set' % namespace, after_header='%s client rule set' % namespace),
+             entries=after, added=to_add, removed=to_remove)
 
 
 if __name__ == '__main__':
