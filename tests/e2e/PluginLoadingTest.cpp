@@ -83,6 +83,26 @@ TEST_P(PluginLoadingTest, UntrustedOrStrayLibrariesAreSkipped)
 
 const std::string kWritable = "it can be written by users other than its owner";
 
+// What autocli says last when no plug-in in `folder` was loaded.
+std::string NothingLoaded(const std::string& folder) { return "No plug-in could be loaded from '" + folder + "'.\n"; }
+
+// A plug-in in `folder` (under the test's folder) where `open`, that folder or one above it,
+// has `mode`, writable by others: the whole folder is refused.
+LoadCase OpenFolderCase(const char* name, const std::string& folder, const std::string& open, mode_t mode)
+{
+    return {name,
+            [=](const Folder& f) {
+                Plugin(f / (folder + "/a.so"));
+                ::chmod((f / open).c_str(), mode);
+                return f / folder;
+            },
+            3, false,
+            [=](const Folder& f) {
+                return "Skipping the plug-in folder '" + (f / folder) + "': '" + (f / open) + "': " + kWritable +
+                       ".\n" + NothingLoaded(f / folder);
+            }};
+}
+
 const LoadCase kLoadCases[] = {
     {"relativeFolder", [](const Folder&) { return std::string("lib/autocli/plugins"); }, 2, false,
      [](const Folder&) {
@@ -115,30 +135,10 @@ const LoadCase kLoadCases[] = {
      3, false,
      [](const Folder& f) {
          return "Skipping plug-in '" + (f / "p/a.so") + "': it is owned by user " + std::to_string(NobodyUid()) +
-                ", neither root nor the caller.\nNo plug-in could be loaded from '" + (f / "p") + "'.\n";
+                ", neither root nor the caller.\n" + NothingLoaded(f / "p");
      }},
-    {"groupWritableFolder",
-     [](const Folder& f) {
-         Plugin(f / "p/a.so");
-         ::chmod((f / "p").c_str(), 0775);
-         return f / "p";
-     },
-     3, false,
-     [](const Folder& f) {
-         return "Skipping the plug-in folder '" + (f / "p") + "': '" + (f / "p") + "': " + kWritable +
-                ".\nNo plug-in could be loaded from '" + (f / "p") + "'.\n";
-     }},
-    {"worldWritableFolderAbove",
-     [](const Folder& f) {
-         Plugin(f / "open/p/a.so");
-         ::chmod((f / "open").c_str(), 0777);
-         return f / "open/p";
-     },
-     3, false,
-     [](const Folder& f) {
-         return "Skipping the plug-in folder '" + (f / "open/p") + "': '" + (f / "open") + "': " + kWritable +
-                ".\nNo plug-in could be loaded from '" + (f / "open/p") + "'.\n";
-     }},
+    OpenFolderCase("groupWritableFolder", "p", "p", 0775),
+    OpenFolderCase("worldWritableFolderAbove", "open/p", "open", 0777),
     {"linkIntoAnOpenFolder",
      [](const Folder& f) {
          Plugin(f / "open/a.so");

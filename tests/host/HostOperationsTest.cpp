@@ -11,30 +11,20 @@
 #include "hostctl/HostCtlException.h"
 #include "hostctl/Network.h"
 #include "hostctl/StorageInfoImpl.h"
+#include "support/HostErrors.h"
 #include "support/HostFixture.h"
 
 namespace {
 
-using HostCtl::Lib::HostCtlException;
 using HostCtl::Storage::NFS_VERSION_3;
 using HostCtl::Storage::NFS_VERSION_41;
 using KnxCtl::Storage::HlFileSystemImpl;
 using KnxCtl::Storage::StorageInfoImpl;
 using KnxCtl::Storage::UnresolvedHlfsExtentImpl;
 using KnxCtl::Storage::UnresolvedHlfsVolumeImpl;
-using TestSupport::ScopedHost;
+using namespace TestSupport; // ScopedHost, MessageOf
 using Fs = HostCtl::Storage::FileSystem;
 using Nfs = HostCtl::Storage::NetworkFileSystem;
-
-std::string MessageOf(const std::function<void()>& call)
-{
-    try {
-        call();
-    } catch (const HostCtlException& e) {
-        return e.message;
-    }
-    return "";
-}
 
 std::vector<std::string> Names(const auto& objects)
 {

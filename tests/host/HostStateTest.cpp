@@ -19,6 +19,8 @@
 #include "hostctl/Host.h"
 #include "hostctl/HostCtlException.h"
 #include "hostctl/StorageInfoImpl.h"
+#include "support/Files.h"
+#include "support/HostErrors.h"
 #include "support/HostFixture.h"
 
 namespace {
@@ -26,28 +28,12 @@ namespace {
 using namespace std::string_literals;
 using HostCtl::Lib::HostCtlException;
 using KnxCtl::Storage::StorageInfoImpl;
+using TestSupport::MessageOf;
+using TestSupport::ReadFile;
 using TestSupport::ScopedHost;
 using Fs = HostCtl::Storage::FileSystem;
 
-std::string ReadFile(const std::string& path)
-{
-    std::ifstream in(path, std::ios::binary);
-    std::ostringstream text;
-    text << in.rdbuf();
-    return text.str();
-}
-
 bool Exists(const std::string& path) { return ::access(path.c_str(), F_OK) == 0; }
-
-std::string MessageOf(const std::function<void()>& call)
-{
-    try {
-        call();
-    } catch (const HostCtlException& e) {
-        return e.message;
-    }
-    return "(no exception)";
-}
 
 struct BadState {
     const char* name;

@@ -33,6 +33,7 @@
 #include "hostctl/HostCtlException.h"
 #include "hostctl/StorageInfoImpl.h"
 #include "support/Cli.h"
+#include "support/Files.h"
 #include "support/TempFolder.h"
 
 extern char** environ;
@@ -42,7 +43,9 @@ namespace {
 namespace fs = std::filesystem;
 using KnxCtl::Storage::StorageInfoImpl;
 using TestSupport::CliResult;
+using TestSupport::ReadFile;
 using TestSupport::RunAutocli;
+using TestSupport::WriteFile;
 
 // A test's folder; runs without --state use the default path inside it.
 class Folder : public TestSupport::TempFolder {
@@ -58,16 +61,6 @@ fs::path MemoryBacked()
     std::error_code error;
     return fs::is_directory("/dev/shm", error) ? fs::path("/dev/shm") : fs::temp_directory_path();
 }
-
-std::string ReadFile(const std::string& path)
-{
-    std::ifstream in(path, std::ios::binary);
-    std::ostringstream text;
-    text << in.rdbuf();
-    return text.str();
-}
-
-void WriteFile(const std::string& path, const std::string& text) { std::ofstream(path, std::ios::binary) << text; }
 
 // Every name under `root`, with a trailing "/" for folders and "@" for links.
 std::vector<std::string> Tree(const std::string& root)
@@ -275,6 +268,22 @@ const std::vector<std::string> kChange{"storage", "filesystem", "unmount", "-l",
 
 std::vector<std::string> StateArgs(const std::string& path) { return {"--state", path}; }
 
+// A state whose lock file `replace` has swapped for something else: a change is refused, as
+// `why` says, before anything is touched.
+PathCase LockReplacedCase(const char* name, void (*replace)(const fs::path& lock), const char* why)
+{
+    return {
+        name,
+        [replace](const Folder& f) {
+            InitState(f);
+            fs::remove(f / "host.json.lock");
+            replace(f / "host.json.lock");
+            return StateArgs(f / "host.json");
+        },
+        kChange, 3,
+        [why](const Folder& f) { return "Lock file " + Quoted(f / "host.json.lock") + " " + why + "; remove it\n"; }};
+}
+
 const PathCase kPathCases[] = {
     {"fifo",
      [](const Folder& f) {
@@ -315,26 +324,11 @@ const PathCase kPathCases[] = {
          return "Cannot use host state file " + Quoted(f / "xdg/autocli/host.json") +
                 ": Too many levels of symbolic links\n";
      }},
-    {"lockIsALink",
-     [](const Folder& f) {
-         InitState(f);
-         fs::remove(f / "host.json.lock");
-         fs::create_symlink(f / "created-by-root", f / "host.json.lock");
-         return StateArgs(f / "host.json");
-     },
-     kChange, 3,
-     [](const Folder& f) { return "Lock file " + Quoted(f / "host.json.lock") + " is a symbolic link; remove it\n"; }},
-    {"lockIsAFifo",
-     [](const Folder& f) {
-         InitState(f);
-         fs::remove(f / "host.json.lock");
-         ::mkfifo((f / "host.json.lock").c_str(), 0600);
-         return StateArgs(f / "host.json");
-     },
-     kChange, 3,
-     [](const Folder& f) {
-         return "Lock file " + Quoted(f / "host.json.lock") + " is not a regular file; remove it\n";
-     }},
+    LockReplacedCase(
+        "lockIsALink", [](const fs::path& lock) { fs::create_symlink(lock.parent_path() / "created-by-root", lock); },
+        "is a symbolic link"),
+    LockReplacedCase(
+        "lockIsAFifo", [](const fs::path& lock) { ::mkfifo(lock.c_str(), 0600); }, "is not a regular file"),
     {"namedFileMissing", [](const Folder& f) { return StateArgs(f / "nope/host.json"); }, kChange, 2,
      [](const Folder& f) {
          return "State file " + Quoted(f / "nope/host.json") +

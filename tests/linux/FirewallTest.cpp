@@ -107,12 +107,7 @@ step nft2 nft -j list table inet autocli
     if (steps["add1"].output.find("Operation not permitted") != std::string::npos)
         GTEST_SKIP() << "the packet filter refuses changes here: " << steps["add1"].output;
 
-    struct Expect {
-        const char* step;
-        int exitCode;
-        const char* contains;
-    };
-    const Expect expectations[] = {
+    const std::vector<LinuxTest::StepExpectation> expectations = {
         {"add1", 0, "true"},
         {"add2", 0, "true"},
         {"add3", 0, "true"},
@@ -122,11 +117,7 @@ step nft2 nft -j list table inet autocli
         {"remove", 0, "true"},
         {"removeagain", 1, "IP/Mask '10.20.40.0/24' not found in ruleset nfsClient"},
     };
-    for (const auto& e : expectations) {
-        SCOPED_TRACE(e.step);
-        EXPECT_EQ(steps[e.step].exitCode, e.exitCode) << steps[e.step].output;
-        EXPECT_NE(steps[e.step].output.find(e.contains), std::string::npos) << steps[e.step].output;
-    }
+    LinuxTest::ExpectSteps(steps, expectations);
 
     // The listing is what the packet filter holds, normalised the way it keeps entries.
     ASSERT_EQ(steps["list1"].exitCode, 0) << steps["list1"].output;

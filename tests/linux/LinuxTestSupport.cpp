@@ -1,9 +1,9 @@
 #include "LinuxTestSupport.h"
 
+#include <gtest/gtest.h>
+
 #include <fcntl.h>
-#include <poll.h>
 #include <sched.h>
-#include <spawn.h>
 #include <sys/mount.h>
 #include <sys/wait.h>
 #include <unistd.h>
@@ -16,109 +16,16 @@
 #include <sstream>
 #include <stdexcept>
 
-#include "support/Cli.h"
-
-extern char** environ;
-
 namespace LinuxTest {
-
-namespace {
-
-std::vector<std::string> Environment(const std::vector<std::string>& extra)
-{
-    std::vector<std::string> entries;
-    for (char** entry = environ; *entry != nullptr; ++entry) {
-        const std::string text = *entry;
-        const std::string name = text.substr(0, text.find('='));
-        bool replaced = false;
-        for (const auto& addition : extra)
-            replaced = replaced || addition.substr(0, addition.find('=')) == name;
-        if (!replaced)
-            entries.push_back(text);
-    }
-    entries.insert(entries.end(), extra.begin(), extra.end());
-    return entries;
-}
-
-std::vector<char*> Pointers(std::vector<std::string>& texts)
-{
-    std::vector<char*> pointers;
-    for (auto& text : texts)
-        pointers.push_back(text.data());
-    pointers.push_back(nullptr);
-    return pointers;
-}
-
-// Reads both pipes to their end.
-void Drain(int outFd, int errFd, Ran& result)
-{
-    pollfd fds[2] = {{outFd, POLLIN, 0}, {errFd, POLLIN, 0}};
-    std::string* sinks[2] = {&result.out, &result.err};
-    int open = 2;
-    char buffer[65536];
-    while (open > 0) {
-        if (::poll(fds, 2, -1) < 0) {
-            if (errno == EINTR)
-                continue;
-            break;
-        }
-        for (int i = 0; i < 2; ++i) {
-            if (fds[i].fd < 0 || fds[i].revents == 0)
-                continue;
-            const ssize_t n = ::read(fds[i].fd, buffer, sizeof buffer);
-            if (n > 0) {
-                sinks[i]->append(buffer, static_cast<std::size_t>(n));
-            } else if (n == 0 || errno != EINTR) {
-                ::close(fds[i].fd);
-                fds[i].fd = -1;
-                --open;
-            }
-        }
-    }
-}
-
-} // namespace
 
 Ran Run(const std::vector<std::string>& args, const std::vector<std::string>& env)
 {
-    std::vector<std::string> argv = args;
-    auto envp = Environment(env);
-    auto argvPointers = Pointers(argv);
-    auto envPointers = Pointers(envp);
-    int outPipe[2];
-    int errPipe[2];
-    if (::pipe2(outPipe, O_CLOEXEC) != 0 || ::pipe2(errPipe, O_CLOEXEC) != 0)
-        throw std::runtime_error(std::string("pipe: ") + std::strerror(errno));
-    posix_spawn_file_actions_t actions;
-    posix_spawn_file_actions_init(&actions);
-    posix_spawn_file_actions_addopen(&actions, STDIN_FILENO, "/dev/null", O_RDONLY, 0);
-    posix_spawn_file_actions_adddup2(&actions, outPipe[1], STDOUT_FILENO);
-    posix_spawn_file_actions_adddup2(&actions, errPipe[1], STDERR_FILENO);
-    pid_t pid = -1;
-    const int spawned = posix_spawnp(&pid, argv[0].c_str(), &actions, nullptr, argvPointers.data(), envPointers.data());
-    posix_spawn_file_actions_destroy(&actions);
-    ::close(outPipe[1]);
-    ::close(errPipe[1]);
-    Ran result;
-    if (spawned != 0) {
-        ::close(outPipe[0]);
-        ::close(errPipe[0]);
-        result.exitCode = 127;
-        result.err = "cannot start " + argv[0] + ": " + std::strerror(spawned);
-        return result;
-    }
-    Drain(outPipe[0], errPipe[0], result);
-    int status = 0;
-    while (::waitpid(pid, &status, 0) < 0 && errno == EINTR) {
-    }
-    result.exitCode = WIFEXITED(status) ? WEXITSTATUS(status) : 128 + WTERMSIG(status);
-    return result;
+    return TestSupport::RunProgram(args, env);
 }
 
 Ran Autocli(const std::vector<std::string>& args, const std::vector<std::string>& env)
 {
-    const auto ran = TestSupport::RunAutocli(args, "", env);
-    return {ran.exitCode, ran.out, ran.err};
+    return TestSupport::RunAutocli(args, "", env);
 }
 
 Ran RunInNamespaces(const std::vector<std::string>& flags, const std::string& script,
@@ -150,6 +57,15 @@ std::map<std::string, Step> ParseSteps(const std::string& out)
         }
     }
     return steps;
+}
+
+void ExpectSteps(std::map<std::string, Step>& steps, const std::vector<StepExpectation>& expected)
+{
+    for (const auto& e : expected) {
+        SCOPED_TRACE(e.step);
+        EXPECT_EQ(steps[e.step].exitCode, e.exitCode) << steps[e.step].output;
+        EXPECT_NE(steps[e.step].output.find(e.contains), std::string::npos) << steps[e.step].output;
+    }
 }
 
 std::optional<std::string> NamespaceProblem(const std::vector<std::string>& flags)
@@ -234,16 +150,6 @@ TempDir::~TempDir()
     std::error_code ignored;
     std::filesystem::remove_all(path_, ignored);
 }
-
-std::string ReadFile(const std::string& path)
-{
-    std::ifstream in(path, std::ios::binary);
-    std::ostringstream text;
-    text << in.rdbuf();
-    return text.str();
-}
-
-void WriteFile(const std::string& path, const std::string& text) { std::ofstream(path, std::ios::binary) << text; }
 
 bool KernelHasNfsClient()
 {

@@ -9,13 +9,12 @@
 #include <string>
 #include <vector>
 
+#include "support/Cli.h"
+#include "support/Files.h"
+
 namespace LinuxTest {
 
-struct Ran {
-    int exitCode = -1;
-    std::string out;
-    std::string err;
-};
+using Ran = TestSupport::CliResult;
 
 // Runs `args` (args[0] looked up in PATH) with no standard input; `env` adds or replaces
 // "NAME=VALUE" entries.
@@ -40,6 +39,15 @@ struct Step {
 // The steps a script printed, by name.
 std::map<std::string, Step> ParseSteps(const std::string& out);
 
+// What one step must end with: its exit code, and a text its output contains.
+struct StepExpectation {
+    const char* step;
+    int exitCode;
+    const char* contains;
+};
+// Checks the steps in `expected` (a missing step fails) against those a script printed.
+void ExpectSteps(std::map<std::string, Step>& steps, const std::vector<StepExpectation>& expected);
+
 // Why namespaces of that kind cannot be made here, or nothing when they can.
 std::optional<std::string> NamespaceProblem(const std::vector<std::string>& flags);
 
@@ -61,8 +69,8 @@ private:
     std::string path_;
 };
 
-std::string ReadFile(const std::string& path);
-void WriteFile(const std::string& path, const std::string& text);
+using TestSupport::ReadFile;
+using TestSupport::WriteFile;
 
 // True when the running kernel lists an "nfs" file system.
 bool KernelHasNfsClient();

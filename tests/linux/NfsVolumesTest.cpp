@@ -118,12 +118,7 @@ step registry2 cat "$DIR/linux-host.json"
     ASSERT_EQ(ran.exitCode, 0) << ran.out << ran.err;
     auto steps = LinuxTest::ParseSteps(ran.out);
 
-    struct Expect {
-        const char* step;
-        int exitCode;
-        const char* contains;
-    };
-    const Expect expectations[] = {
+    const std::vector<LinuxTest::StepExpectation> expectations = {
         {"root", 1, "Volume '/' was not added with autocli"},
         {"proc", 1, "No NAS volume was found mounted on '/proc'"},
         {"unmount", 0, "true"},
@@ -136,11 +131,7 @@ step registry2 cat "$DIR/linux-host.json"
         {"busyremove", 1, "Volume 'vol41' is busy"},
         {"remove41", 0, "true"},
     };
-    for (const auto& e : expectations) {
-        SCOPED_TRACE(e.step);
-        EXPECT_EQ(steps[e.step].exitCode, e.exitCode) << steps[e.step].output;
-        EXPECT_NE(steps[e.step].output.find(e.contains), std::string::npos) << steps[e.step].output;
-    }
+    LinuxTest::ExpectSteps(steps, expectations);
 
     // Lists: the mounted volume from the mount table, the other from the registry.
     const auto v3 = nlohmann::json::parse(steps["nfslist"].output);

@@ -8,9 +8,24 @@
 #include <unistd.h>
 
 #include <cstdlib>
+#include <ostream>
 
 #include "LinuxTestSupport.h"
 #include "host/linux/LinuxRegistry.h"
+
+namespace HostLinux {
+
+// A volume as a failed comparison shows it.
+void PrintTo(const RegisteredVolume& v, std::ostream* os)
+{
+    *os << "{name '" << v.name << "', v41 " << v.v41 << ", hosts";
+    for (const auto& host : v.hosts)
+        *os << " '" << host << "'";
+    *os << ", share '" << v.share << "', readOnly " << v.readOnly << ", connections " << v.connections << ", security "
+        << v.security << ", explicitlyUnmounted " << v.explicitlyUnmounted << "}";
+}
+
+} // namespace HostLinux
 
 namespace {
 
@@ -78,16 +93,7 @@ TEST(Registry, SavesEveryFieldAndKeepsTheFileMode)
     Registry again(folder);
     const auto loaded = again.Load();
     ASSERT_EQ(loaded.size(), 1u);
-    const RegisteredVolume& v = loaded[0];
-    const RegisteredVolume expected = Sample();
-    EXPECT_EQ(v.name, expected.name);
-    EXPECT_EQ(v.v41, expected.v41);
-    EXPECT_EQ(v.hosts, expected.hosts);
-    EXPECT_EQ(v.share, expected.share);
-    EXPECT_EQ(v.readOnly, expected.readOnly);
-    EXPECT_EQ(v.connections, expected.connections);
-    EXPECT_EQ(v.security, expected.security);
-    EXPECT_EQ(v.explicitlyUnmounted, expected.explicitlyUnmounted);
+    EXPECT_EQ(loaded[0], Sample());
     again.Update([](std::vector<RegisteredVolume>& volumes) { volumes.clear(); });
     EXPECT_EQ(ModeOf(folder + "/linux-host.json"), 0640u);
     EXPECT_TRUE(again.Load().empty());

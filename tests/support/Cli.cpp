@@ -9,6 +9,7 @@
 #include <cerrno>
 #include <cstring>
 #include <stdexcept>
+#include <utility>
 
 #include "framework/Render.h"
 
@@ -47,16 +48,10 @@ std::vector<char*> Pointers(std::vector<std::string>& texts)
     return pointers;
 }
 
-} // namespace
-
-CliResult RunAutocli(const std::vector<std::string>& args, const std::string& statePath,
-                     const std::vector<std::string>& env)
+// Runs `argv`; a program that cannot be started throws when `mustStart`, else ends with 127
+// and says why on standard error, as a shell would.
+CliResult Spawn(std::vector<std::string> argv, const std::vector<std::string>& env, bool mustStart)
 {
-    std::vector<std::string> argv{AUTOCLI_BINARY};
-    if (!statePath.empty()) {
-        argv.insert(argv.end(), {"--state", statePath});
-    }
-    argv.insert(argv.end(), args.begin(), args.end());
     auto envp = Environment(env);
     auto argvPointers = Pointers(argv);
     auto envPointers = Pointers(envp);
@@ -72,17 +67,23 @@ CliResult RunAutocli(const std::vector<std::string>& args, const std::string& st
     posix_spawn_file_actions_adddup2(&actions, outPipe[1], STDOUT_FILENO);
     posix_spawn_file_actions_adddup2(&actions, errPipe[1], STDERR_FILENO);
     pid_t pid = -1;
-    const int spawned = posix_spawn(&pid, argv[0].c_str(), &actions, nullptr, argvPointers.data(), envPointers.data());
+    const int spawned = posix_spawnp(&pid, argv[0].c_str(), &actions, nullptr, argvPointers.data(), envPointers.data());
     posix_spawn_file_actions_destroy(&actions);
     ::close(outPipe[1]);
     ::close(errPipe[1]);
+    CliResult result;
     if (spawned != 0) {
         ::close(outPipe[0]);
         ::close(errPipe[0]);
-        throw std::runtime_error("cannot start " + argv[0] + ": " + std::strerror(spawned));
+        const std::string why = "cannot start " + argv[0] + ": " + std::strerror(spawned);
+        if (mustStart) {
+            throw std::runtime_error(why);
+        }
+        result.exitCode = 127;
+        result.err = why;
+        return result;
     }
 
-    CliResult result;
     pollfd fds[2] = {{outPipe[0], POLLIN, 0}, {errPipe[0], POLLIN, 0}};
     std::string* sinks[2] = {&result.out, &result.err};
     int open = 2;
@@ -118,6 +119,24 @@ CliResult RunAutocli(const std::vector<std::string>& args, const std::string& st
     }
     result.exitCode = WIFEXITED(status) ? WEXITSTATUS(status) : 128 + WTERMSIG(status);
     return result;
+}
+
+} // namespace
+
+CliResult RunAutocli(const std::vector<std::string>& args, const std::string& statePath,
+                     const std::vector<std::string>& env)
+{
+    std::vector<std::string> argv{AUTOCLI_BINARY};
+    if (!statePath.empty()) {
+        argv.insert(argv.end(), {"--state", statePath});
+    }
+    argv.insert(argv.end(), args.begin(), args.end());
+    return Spawn(std::move(argv), env, true);
+}
+
+CliResult RunProgram(const std::vector<std::string>& argv, const std::vector<std::string>& env)
+{
+    return Spawn(argv, env, false);
 }
 
 CommandResult Execute(Quillets::AutoCli::Command& command, const std::shared_ptr<Quillets::CallSpec::Input>& in)

@@ -21,6 +21,10 @@ struct CliResult {
 CliResult RunAutocli(const std::vector<std::string>& args, const std::string& statePath = "",
                      const std::vector<std::string>& env = {});
 
+// Runs `argv` (argv[0] looked up in PATH when it holds no '/') with no standard input; `env`
+// adds or replaces "NAME=VALUE" entries. A program that cannot be started ends with 127.
+CliResult RunProgram(const std::vector<std::string>& argv, const std::vector<std::string>& env = {});
+
 struct CommandResult {
     std::vector<std::string> errors;
     std::shared_ptr<Quillets::MetaObj::MetaObject> root;

@@ -10,6 +10,7 @@
 #include <optional>
 #include <stdexcept>
 #include <type_traits>
+#include <utility>
 
 #include "FeatureList.h"
 #include "LinuxFirewall.h"
@@ -34,32 +35,20 @@ bool gActive = false;
 // inaccessible rather than the command hang.
 constexpr int kStatSeconds = 5;
 
-// Runs one host call: other failures become HostCtlException; journaled calls are recorded
-// with their outcome, as the simulated host records them.
+// Runs one host call as the simulated host runs its calls (journaled with their outcome);
+// failures other than HostCtlException, such as the machine's own errors, become one.
 template <typename F>
 auto Call(std::string_view call, const Journal* journal, F&& body) -> decltype(body())
 {
-    try {
-        if constexpr (std::is_void_v<decltype(body())>) {
-            body();
-            if (journal)
-                HostSim::Runtime::WriteJournal(call, *journal, nullptr);
-        } else {
-            auto result = body();
-            if (journal)
-                HostSim::Runtime::WriteJournal(call, *journal, nullptr);
-            return result;
+    return HostSim::Runtime::Run(call, journal, [&]() -> decltype(body()) {
+        try {
+            return body();
+        } catch (const HostCtlException&) {
+            throw;
+        } catch (const std::exception& e) {
+            throw HostCtlException(e.what());
         }
-    } catch (const HostCtlException& e) {
-        if (journal)
-            HostSim::Runtime::WriteJournal(call, *journal, &e.message);
-        throw;
-    } catch (const std::exception& e) {
-        const std::string message = e.what();
-        if (journal)
-            HostSim::Runtime::WriteJournal(call, *journal, &message);
-        throw HostCtlException(message);
-    }
+    });
 }
 
 Registry& TheRegistry()
@@ -226,34 +215,29 @@ std::string NotAddedHere(const Volume& v)
            "with autocli are mounted, changed or unmounted through it";
 }
 
+// The security flavours by the names mount options give them.
+constexpr std::pair<NetworkFileSystem::SecurityType, const char*> kSecurityOptions[] = {
+    {NetworkFileSystem::SEC_SYS, "sys"},
+    {NetworkFileSystem::SEC_KRB5, "krb5"},
+    {NetworkFileSystem::SEC_KRB5I, "krb5i"},
+    {NetworkFileSystem::SEC_KRB5P, "krb5p"},
+};
+
 const char* SecurityOption(int security)
 {
-    switch (security) {
-    case NetworkFileSystem::SEC_SYS:
-        return "sys";
-    case NetworkFileSystem::SEC_KRB5:
-        return "krb5";
-    case NetworkFileSystem::SEC_KRB5I:
-        return "krb5i";
-    case NetworkFileSystem::SEC_KRB5P:
-        return "krb5p";
-    default:
-        return nullptr;
-    }
+    for (const auto& [type, option] : kSecurityOptions)
+        if (type == security)
+            return option;
+    return nullptr;
 }
 
 NetworkFileSystem::SecurityType SecurityFromOption(const std::string& sec)
 {
     // The first flavour of a list is the one in use.
     const std::string first = sec.substr(0, sec.find(':'));
-    if (first == "sys")
-        return NetworkFileSystem::SEC_SYS;
-    if (first == "krb5")
-        return NetworkFileSystem::SEC_KRB5;
-    if (first == "krb5i")
-        return NetworkFileSystem::SEC_KRB5I;
-    if (first == "krb5p")
-        return NetworkFileSystem::SEC_KRB5P;
+    for (const auto& [type, option] : kSecurityOptions)
+        if (first == option)
+            return type;
     return NetworkFileSystem::SEC_NONE;
 }
 

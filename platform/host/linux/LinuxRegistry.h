@@ -18,6 +18,8 @@ struct RegisteredVolume {
     std::int64_t connections = 1;
     int security = 0; // NetworkFileSystem::SecurityType
     bool explicitlyUnmounted = false;
+
+    bool operator==(const RegisteredVolume&) const = default;
 };
 
 class Registry {
