@@ -62,6 +62,10 @@ public:
     Row& Set(int field, int value) { return Set(field, static_cast<long>(value)); }
     Row& Set(int field, const std::string& value);
     Row& Set(int field, const char* value) { return Set(field, std::string(value)); }
+    // Sets `field` to `read()` only while the shape has it: a switched-off column never asks
+    // the host.
+    template <typename Read>
+    Row& SetIfPresent(int field, Read&& read);
 
     const std::shared_ptr<MetaStruct>& Structure() const { return structure_; }
 
@@ -93,5 +97,14 @@ private:
     const ColumnTable* table_ = nullptr;
     std::vector<const Column*> columns_;
 };
+
+template <typename Read>
+Row& Row::SetIfPresent(int field, Read&& read)
+{
+    if (shape_->Has(field)) {
+        Set(field, read());
+    }
+    return *this;
+}
 
 } // namespace OrvaneCli::FileSystem

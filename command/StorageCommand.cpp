@@ -1,5 +1,7 @@
 #include "command/StorageCommand.h"
 
+#include "command/Selection.h"
+
 namespace OrvaneCli::FileSystem {
 
 StorageCommand::StorageCommand(CommandDecl decl) : decl_(std::move(decl))
@@ -41,16 +43,34 @@ std::shared_ptr<OutputSpec> StorageCommand::GetOutputSpecInternal()
 
 void StorageCommand::ExecuteInternal(const InputPtr& in, const OutputPtr& out) { Run(in, out); }
 
-HostActionCommand::HostActionCommand(const char* description, Action action, StorageInfoPlacement placement)
-    : StorageCommand({description}), action_(action), placement_(placement)
+HostActionCommand::HostActionCommand(const char* description, StorageInfoPlacement placement)
+    : StorageCommand({description}), placement_(placement)
 {
 }
 
 void HostActionCommand::Run(const InputPtr&, const OutputPtr& out)
 {
     WithStorageInfo(placement_, out, [&](StorageInfoImpl& storage) {
-        action_(storage);
+        Act(storage);
         out->SetRootObject(MetaBool::New(true));
+    });
+}
+
+HlfsVolumeReport::HlfsVolumeReport(const char* description, const ColumnTable& columns)
+    : StorageCommand({.description = description,
+                      .result = One(columns),
+                      .formatter = "simple",
+                      .parameters = {HlfsLabelParameter(), HlfsUuidParameter()}})
+{
+}
+
+void HlfsVolumeReport::Run(const InputPtr& in, const OutputPtr& out)
+{
+    WithSingleHLFSVolume(in, out, [&](HlFileSystem& volume) {
+        const RowShape shape = Rows();
+        auto row = shape.NewRow();
+        Fill(volume, row);
+        out->SetRootObject(row.Structure());
     });
 }
 

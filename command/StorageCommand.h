@@ -56,17 +56,31 @@ private:
     CommandDecl decl_;
 };
 
-// A command that makes one StorageInfoImpl call and is true when it returns.
+// A command that makes one StorageInfoImpl call, its Act, and is true when it returns.
 class HostActionCommand : public StorageCommand {
+public:
+    HostActionCommand(const char* description, StorageInfoPlacement placement);
+
 protected:
-    using Action = void (*)(StorageInfoImpl& storage);
-    HostActionCommand(const char* description, Action action, StorageInfoPlacement placement);
+    virtual void Act(StorageInfoImpl& storage) = 0;
 
 private:
     void Run(const InputPtr& in, const OutputPtr& out) final;
 
-    Action action_;
     StorageInfoPlacement placement_;
+};
+
+// A report on the one HLFS volume named by -l/-u, in one structure of `columns` whose fields
+// Fill sets. No volume or a host failure leaves no result.
+class HlfsVolumeReport : public StorageCommand {
+public:
+    HlfsVolumeReport(const char* description, const ColumnTable& columns);
+
+protected:
+    virtual void Fill(HlFileSystem& volume, Row& row) = 0;
+
+private:
+    void Run(const InputPtr& in, const OutputPtr& out) final;
 };
 
 // Makes a command for the tree.

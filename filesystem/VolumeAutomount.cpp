@@ -7,17 +7,17 @@ namespace {
 
 // storage filesystem automount
 class VolumeAutomount final : public HostActionCommand {
-public:
-    VolumeAutomount()
-        : HostActionCommand(
-              "Request mounting of known datastores not explicitly unmounted.",
-              [](StorageInfoImpl& storage) { storage.AutoFullMountVolumes(); }, StorageInfoPlacement::OutsideGuard)
-    {
-    }
+    using HostActionCommand::HostActionCommand;
+
+    void Act(StorageInfoImpl& storage) override { storage.AutoFullMountVolumes(); }
 };
 
 } // namespace
 
-NodePtr NewVolumeAutomount() { return New<VolumeAutomount>(); }
+NodePtr NewVolumeAutomount()
+{
+    return New<VolumeAutomount>("Request mounting of known datastores not explicitly unmounted.",
+                                StorageInfoPlacement::OutsideGuard);
+}
 
 } // namespace OrvaneCli::FileSystem

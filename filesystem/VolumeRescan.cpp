@@ -7,17 +7,16 @@ namespace {
 
 // storage filesystem rescan
 class VolumeRescan final : public HostActionCommand {
-public:
-    VolumeRescan()
-        : HostActionCommand(
-              "Scan storage devices for new mountable filesystems.",
-              [](StorageInfoImpl& storage) { storage.RescanHlfs(); }, StorageInfoPlacement::OutsideGuard)
-    {
-    }
+    using HostActionCommand::HostActionCommand;
+
+    void Act(StorageInfoImpl& storage) override { storage.RescanHlfs(); }
 };
 
 } // namespace
 
-NodePtr NewVolumeRescan() { return New<VolumeRescan>(); }
+NodePtr NewVolumeRescan()
+{
+    return New<VolumeRescan>("Scan storage devices for new mountable filesystems.", StorageInfoPlacement::OutsideGuard);
+}
 
 } // namespace OrvaneCli::FileSystem

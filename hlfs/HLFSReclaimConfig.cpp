@@ -33,16 +33,11 @@ const ColumnTable kColumns("HlfsReclaim",
                                {kBandwidthField, "Reclaim Bandwidth", ColumnType::Int, {.unit = "MB/s"}},
                            });
 
-const CommandDecl kHLFSReclaimConfigGetDecl = {.description = "Get space reclamation configuration parameters",
-                                               .result = One(kColumns),
-                                               .formatter = "simple",
-                                               .parameters = {HlfsLabelParameter(), HlfsUuidParameter()}};
-
 // storage hlfs reclaim config get
-class HLFSReclaimConfigGet final : public StorageCommand {
-    using StorageCommand::StorageCommand;
+class HLFSReclaimConfigGet final : public HlfsVolumeReport {
+    using HlfsVolumeReport::HlfsVolumeReport;
 
-    void Run(const InputPtr& in, const OutputPtr& out) override;
+    void Fill(HlFileSystem& volume, Row& row) override;
 };
 
 const CommandDecl kHLFSReclaimConfigSetDecl = {
@@ -68,18 +63,13 @@ class HLFSReclaimConfigSet final : public StorageCommand {
 
 } // namespace
 
-void HLFSReclaimConfigGet::Run(const InputPtr& in, const OutputPtr& out)
+void HLFSReclaimConfigGet::Fill(HlFileSystem& volume, Row& row)
 {
-    WithSingleHLFSVolume(in, out, [&](HlFileSystem& volume) {
-        const HlfsVolumeUnmapProperty property = volume.GetUnmapProperty();
-        const RowShape shape = Rows();
-        auto structure = shape.NewRow();
-        structure.Set(kGranularityField, static_cast<long>(property.granularity));
-        structure.Set(kPriorityField, property.priority);
-        structure.Set(kMethodField, property.method);
-        structure.Set(kBandwidthField, static_cast<int>(property.bandwidth));
-        out->SetRootObject(structure.Structure());
-    });
+    const HlfsVolumeUnmapProperty property = volume.GetUnmapProperty();
+    row.Set(kGranularityField, static_cast<long>(property.granularity));
+    row.Set(kPriorityField, property.priority);
+    row.Set(kMethodField, property.method);
+    row.Set(kBandwidthField, static_cast<int>(property.bandwidth));
 }
 
 void HLFSReclaimConfigSet::Run(const InputPtr& in, const OutputPtr& out)
@@ -145,7 +135,10 @@ void HLFSReclaimConfigSet::Run(const InputPtr& in, const OutputPtr& out)
     });
 }
 
-NodePtr NewHLFSReclaimConfigGet() { return New<HLFSReclaimConfigGet>(kHLFSReclaimConfigGetDecl); }
+NodePtr NewHLFSReclaimConfigGet()
+{
+    return New<HLFSReclaimConfigGet>("Get space reclamation configuration parameters", kColumns);
+}
 NodePtr NewHLFSReclaimConfigSet() { return New<HLFSReclaimConfigSet>(kHLFSReclaimConfigSetDecl); }
 
 } // namespace OrvaneCli::FileSystem

@@ -20,49 +20,42 @@ const ColumnTable kColumns("HLFSSnapshotExtent", {
                                                      {kEnd, "End", ColumnType::Int},
                                                  });
 
-const CommandDecl kHLFSSnapshotExtentListDecl = {
-    .description = "List extents of unresolved snapshots/replicas of HLFS volume.",
-    .result = ListOf(kColumns),
-    .formatter = "table",
-    .parameters = {LabelParameter("The HLFS volume label of the target snapshot to enumerate."),
-                   UuidParameter("The HLFS volume uuid of the target snapshot to enumerate.")}};
-
 // storage hlfs snapshot extent list
-class HLFSSnapshotExtentList final : public StorageCommand {
-    using StorageCommand::StorageCommand;
+class HLFSSnapshotExtentList final : public SnapshotListing {
+    using SnapshotListing::SnapshotListing;
 
-    void Run(const InputPtr& in, const OutputPtr& out) override
+    void AddRows(UnresolvedHlfsVolumeImpl& volume, const RowShape& shape, MetaList& list, const OutputPtr& out) override
     {
-        // Outer scope: a failure listing the copies, their extents or the selection ends the walk.
-        const RowShape shape = Rows();
-        ListSelectedSnapshots(in, out, shape.EmptyList(), [&](UnresolvedHlfsVolumeImpl& volume, MetaList& list) {
-            const auto extents = volume.GetExtents();
-            // Inner scope: a failure on one extent drops the rest of this copy's extents only.
-            Guarded(out, [&] {
-                // The number is the position in the host's vector, so skipped entries still count.
-                for (std::size_t index = 0; index < extents.size(); ++index) {
-                    UnresolvedHlfsExtentImpl* extent = AsSnapshotExtent(extents[index]);
-                    if (extent == nullptr) {
-                        continue;
-                    }
-                    auto row = shape.NewRow();
-                    row.Set(kVolumeName, volume.GetVolumeName());
-                    row.Set(kHlfsUuid, volume.GetUuid());
-                    row.Set(kLvmUuid, volume.GetLvmUuid());
-                    row.Set(kExtentNumber, static_cast<long>(index));
-                    row.Set(kDeviceName, extent->GetDeviceName());
-                    row.Set(kPartition, static_cast<int>(extent->GetPartition()));
-                    row.Set(kStart, static_cast<long>(extent->GetStart()));
-                    row.Set(kEnd, static_cast<long>(extent->GetEnd()));
-                    list.Add(row.Structure());
+        const auto extents = volume.GetExtents();
+        // Inner scope: a failure on one extent drops the rest of this copy's extents only.
+        Guarded(out, [&] {
+            // The number is the position in the host's vector, so skipped entries still count.
+            for (std::size_t index = 0; index < extents.size(); ++index) {
+                UnresolvedHlfsExtentImpl* extent = AsSnapshotExtent(extents[index]);
+                if (extent == nullptr) {
+                    continue;
                 }
-            });
+                auto row = shape.NewRow();
+                row.Set(kVolumeName, volume.GetVolumeName());
+                row.Set(kHlfsUuid, volume.GetUuid());
+                row.Set(kLvmUuid, volume.GetLvmUuid());
+                row.Set(kExtentNumber, static_cast<long>(index));
+                row.Set(kDeviceName, extent->GetDeviceName());
+                row.Set(kPartition, static_cast<int>(extent->GetPartition()));
+                row.Set(kStart, static_cast<long>(extent->GetStart()));
+                row.Set(kEnd, static_cast<long>(extent->GetEnd()));
+                list.Add(row.Structure());
+            }
         });
     }
 };
 
 } // namespace
 
-NodePtr NewHLFSSnapshotExtentList() { return New<HLFSSnapshotExtentList>(kHLFSSnapshotExtentListDecl); }
+NodePtr NewHLFSSnapshotExtentList()
+{
+    return New<HLFSSnapshotExtentList>("List extents of unresolved snapshots/replicas of HLFS volume.", kColumns,
+                                       "table", "the target snapshot to enumerate");
+}
 
 } // namespace OrvaneCli::FileSystem

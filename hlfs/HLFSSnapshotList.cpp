@@ -27,44 +27,38 @@ std::string ReasonColumn(bool passed, unsigned code)
     return passed ? std::string() : std::string(TranslateSnapshotReason(code));
 }
 
-const CommandDecl kHLFSSnapshotListDecl = {
-    .description = "List unresolved snapshots/replicas of HLFS volume.",
-    .result = ListOf(kColumns),
-    .formatter = "simple",
-    .parameters = {LabelParameter("The HLFS volume label of the snapshot to list."),
-                   UuidParameter("The HLFS volume uuid of the snapshot to list.")}};
-
 // storage hlfs snapshot list
-class HLFSSnapshotList final : public StorageCommand {
-    using StorageCommand::StorageCommand;
+class HLFSSnapshotList final : public SnapshotListing {
+    using SnapshotListing::SnapshotListing;
 
-    void Run(const InputPtr& in, const OutputPtr& out) override
+    void AddRows(UnresolvedHlfsVolumeImpl& volume, const RowShape& shape, MetaList& list,
+                 const OutputPtr& /*out*/) override
     {
-        const RowShape shape = Rows();
-        // A host failure ends the walk; the rows gathered so far are still shown.
-        ListSelectedSnapshots(in, out, shape.EmptyList(), [&](UnresolvedHlfsVolumeImpl& volume, MetaList& list) {
-            auto row = shape.NewRow();
-            row.Set(kVolumeName, volume.GetVolumeName());
-            row.Set(kHlfsUuid, volume.GetUuid());
+        auto row = shape.NewRow();
+        row.Set(kVolumeName, volume.GetVolumeName());
+        row.Set(kHlfsUuid, volume.GetUuid());
 
-            unsigned code = 0;
-            const bool canMount = volume.CanResolve(false, true, &code);
-            row.Set(kCanMount, canMount);
-            row.Set(kMountReason, ReasonColumn(canMount, code));
+        unsigned code = 0;
+        const bool canMount = volume.CanResolve(false, true, &code);
+        row.Set(kCanMount, canMount);
+        row.Set(kMountReason, ReasonColumn(canMount, code));
 
-            code = 0;
-            const bool canResignature = volume.CanResolve(true, false, &code);
-            row.Set(kCanResignature, canResignature);
-            row.Set(kResignatureReason, ReasonColumn(canResignature, code));
+        code = 0;
+        const bool canResignature = volume.CanResolve(true, false, &code);
+        row.Set(kCanResignature, canResignature);
+        row.Set(kResignatureReason, ReasonColumn(canResignature, code));
 
-            row.Set(kExtentCount, static_cast<long>(volume.GetExtents().size()));
-            list.Add(row.Structure());
-        });
+        row.Set(kExtentCount, static_cast<long>(volume.GetExtents().size()));
+        list.Add(row.Structure());
     }
 };
 
 } // namespace
 
-NodePtr NewHLFSSnapshotList() { return New<HLFSSnapshotList>(kHLFSSnapshotListDecl); }
+NodePtr NewHLFSSnapshotList()
+{
+    return New<HLFSSnapshotList>("List unresolved snapshots/replicas of HLFS volume.", kColumns, "simple",
+                                 "the snapshot to list");
+}
 
 } // namespace OrvaneCli::FileSystem

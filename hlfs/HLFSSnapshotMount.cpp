@@ -8,10 +8,10 @@ namespace {
 
 const CommandDecl kHLFSSnapshotMountDecl = {
     .description = "Mount a snapshot/replica of a HLFS volume.",
-    .parameters = {LabelParameter("The HLFS volume label of the snapshot to mount."),
-                   UuidParameter("The HLFS volume uuid of the snapshot to mount."),
-                   {kOptionNoPersist, "n", ParameterType::Flag,
-                    "Mount the volume non-persistently; the volume will not be automounted after a restart."}}};
+    .parameters = SnapshotParameters(
+        "the snapshot to mount",
+        {{kOptionNoPersist, "n", ParameterType::Flag,
+          "Mount the volume non-persistently; the volume will not be automounted after a restart."}})};
 
 // storage hlfs snapshot mount
 class HLFSSnapshotMount final : public StorageCommand {

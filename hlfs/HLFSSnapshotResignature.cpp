@@ -6,10 +6,8 @@ namespace OrvaneCli::FileSystem {
 
 namespace {
 
-const CommandDecl kHLFSSnapshotResignatureDecl = {
-    .description = "Resignature a snapshot/replica of a HLFS volume.",
-    .parameters = {LabelParameter("The HLFS volume label of the snapshot to resignature."),
-                   UuidParameter("The HLFS volume uuid of the snapshot to resignature.")}};
+const CommandDecl kHLFSSnapshotResignatureDecl = {.description = "Resignature a snapshot/replica of a HLFS volume.",
+                                                  .parameters = SnapshotParameters("the snapshot to resignature")};
 
 // storage hlfs snapshot resignature
 class HLFSSnapshotResignature final : public StorageCommand {

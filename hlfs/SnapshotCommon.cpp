@@ -11,6 +11,15 @@ const VolumeSelectorTexts kResolveSnapshotTexts = {
     "No unresolved HLFS snapshots with volume UUID '%s' found.",
 };
 
+std::vector<ParameterDecl> SnapshotParameters(const char* target, std::initializer_list<ParameterDecl> own)
+{
+    std::vector<ParameterDecl> parameters = {LabelParameter(""), UuidParameter("")};
+    parameters[0].description = HostCtl::Misc::StrCat("The HLFS volume label of ", target, ".");
+    parameters[1].description = HostCtl::Misc::StrCat("The HLFS volume uuid of ", target, ".");
+    parameters.insert(parameters.end(), own);
+    return parameters;
+}
+
 const char* TranslateSnapshotReason(unsigned code)
 {
     static constexpr std::array<const char*, 8> reasons = {

@@ -3,12 +3,19 @@
 // What the four snapshot commands share: the reason texts of CanResolve codes, the
 // label/UUID selection of unresolved copies and the checked downcasts of host entries.
 
+#include <initializer_list>
 #include <memory>
 #include <string>
+#include <vector>
 
 #include "command/Selection.h"
+#include "command/StorageCommand.h"
 
 namespace OrvaneCli::FileSystem {
+
+// volume-label and volume-uuid of a snapshot command, then the command's `own` parameters.
+// `target` ends both help texts: "The HLFS volume label of <target>.".
+std::vector<ParameterDecl> SnapshotParameters(const char* target, std::initializer_list<ParameterDecl> own = {});
 
 // The text shown for a CanResolve reason code; unknown codes give "unknown error".
 const char* TranslateSnapshotReason(unsigned code);
@@ -55,6 +62,33 @@ void ListSelectedSnapshots(const InputPtr& in, const OutputPtr& out, const std::
     ForEachSelectedSnapshot(in, out, [&](UnresolvedHlfsVolumeImpl& volume) { each(volume, *list); });
     out->SetRootObject(list);
 }
+
+// The frame of the two snapshot listings: their declaration from the parts that differ, and
+// a walk that asks AddRows for the rows of every selected copy.
+class SnapshotListing : public StorageCommand {
+public:
+    SnapshotListing(const char* description, const ColumnTable& columns, const char* formatter, const char* target)
+        : StorageCommand({.description = description,
+                          .result = ListOf(columns),
+                          .formatter = formatter,
+                          .parameters = SnapshotParameters(target)})
+    {
+    }
+
+protected:
+    // A host failure leaving it ends the walk; the rows gathered so far are still shown.
+    virtual void AddRows(UnresolvedHlfsVolumeImpl& volume, const RowShape& shape, MetaList& list,
+                         const OutputPtr& out) = 0;
+
+private:
+    void Run(const InputPtr& in, const OutputPtr& out) final
+    {
+        const RowShape shape = Rows();
+        ListSelectedSnapshots(in, out, shape.EmptyList(), [&](UnresolvedHlfsVolumeImpl& volume, MetaList& list) {
+            AddRows(volume, shape, list, out);
+        });
+    }
+};
 
 // The texts of the snapshot mount and resignature selection.
 extern const VolumeSelectorTexts kResolveSnapshotTexts;

@@ -11,24 +11,11 @@ constexpr const char* kEnabledParameter = "enabled";
 enum Field { kEnabledField };
 const ColumnTable kColumns("ClusteredHdskInfo", {{kEnabledField, "Enabled", ColumnType::Bool}}, false);
 
-const CommandDecl kClusteredHdskGetDecl = {.description = "Get information about clustered HDSK support.",
-                                           .result = One(kColumns),
-                                           .formatter = "simple",
-                                           .parameters = {HlfsLabelParameter(), HlfsUuidParameter()}};
-
 // storage internal clusteredhdsk get
-class ClusteredHdskGet final : public StorageCommand {
-    using StorageCommand::StorageCommand;
+class ClusteredHdskGet final : public HlfsVolumeReport {
+    using HlfsVolumeReport::HlfsVolumeReport;
 
-    void Run(const InputPtr& in, const OutputPtr& out) override
-    {
-        WithSingleHLFSVolume(in, out, [&](HlFileSystem& volume) {
-            const RowShape shape = Rows();
-            auto structure = shape.NewRow();
-            structure.Set(kEnabledField, volume.IsClusteredHdskEnabled());
-            out->SetRootObject(structure.Structure());
-        });
-    }
+    void Fill(HlFileSystem& volume, Row& row) override { row.Set(kEnabledField, volume.IsClusteredHdskEnabled()); }
 };
 
 const CommandDecl kClusteredHdskSetDecl = {
@@ -54,7 +41,10 @@ class ClusteredHdskSet final : public StorageCommand {
 
 } // namespace
 
-NodePtr NewClusteredHdskGet() { return New<ClusteredHdskGet>(kClusteredHdskGetDecl); }
+NodePtr NewClusteredHdskGet()
+{
+    return New<ClusteredHdskGet>("Get information about clustered HDSK support.", kColumns);
+}
 NodePtr NewClusteredHdskSet() { return New<ClusteredHdskSet>(kClusteredHdskSetDecl); }
 
 } // namespace OrvaneCli::FileSystem

@@ -25,33 +25,45 @@ NamespacePtr PreunmountStateNamespace()
                          {{"enter", NewNFSVolumePreunmountEnter()}, {"exit", NewNFSVolumePreunmountExit()}});
 }
 
+// What storage nfs and storage nfs41 are made of; both versions share one layout.
+struct VersionTree {
+    const char* description;
+    NodePtr add, remove, list;
+    NamespacePtr preunmountState; // NAS only; an empty one is left out
+    NamespacePtr param, firewall;
+};
+
+NamespacePtr VersionNamespace(const VersionTree& tree)
+{
+    return MakeNamespace(tree.description, {{"add", tree.add},
+                                            {"remove", tree.remove},
+                                            {"list", tree.list},
+                                            {"preunmountstate", tree.preunmountState},
+                                            {"param", tree.param},
+                                            {"firewall", tree.firewall}});
+}
+
 } // namespace
 
 NamespacePtr NfsNamespace()
 {
-    return MakeNamespace(
-        "Operations to create, manage, and remove Network Attached Storage filesystems.",
-        {{"add", NewNFSVolumeAdd()},
-         {"remove", NewNFSVolumeRemove()},
-         {"list", NewNFSVolumeList()},
-         {"preunmountstate", PreunmountStateNamespace()},
-         {"param", ParamNamespace("Operations on volume parameters of NAS filesystems.", NewNFSVolumeParamGet(),
-                                  NewNFSVolumeParamSet())},
-         {"firewall", FirewallNamespace("Operations on IP/Mask of nfsClient firewall ruleset", NewNFSFirewallAdd(),
-                                        NewNFSFirewallRemove(), NewNFSFirewallList())}});
+    return VersionNamespace({"Operations to create, manage, and remove Network Attached Storage filesystems.",
+                             NewNFSVolumeAdd(), NewNFSVolumeRemove(), NewNFSVolumeList(), PreunmountStateNamespace(),
+                             ParamNamespace("Operations on volume parameters of NAS filesystems.",
+                                            NewNFSVolumeParamGet(), NewNFSVolumeParamSet()),
+                             FirewallNamespace("Operations on IP/Mask of nfsClient firewall ruleset",
+                                               NewNFSFirewallAdd(), NewNFSFirewallRemove(), NewNFSFirewallList())});
 }
 
 NamespacePtr Nfs41Namespace()
 {
-    return MakeNamespace(
-        "Operations to create, manage, and remove NFS v4.1 filesystems.",
-        {{"add", NewNFS41VolumeAdd()},
-         {"remove", NewNFS41VolumeRemove()},
-         {"list", NewNFS41VolumeList()},
-         {"param", ParamNamespace("Operations on volume parameters of NFS v4.1 filesystems.", NewNFS41VolumeParamGet(),
-                                  NewNFS41VolumeParamSet())},
-         {"firewall", FirewallNamespace("Operations on IP/Mask of nfs41Client firewall ruleset", NewNFS41FirewallAdd(),
-                                        NewNFS41FirewallRemove(), NewNFS41FirewallList())}});
+    return VersionNamespace(
+        {"Operations to create, manage, and remove NFS v4.1 filesystems.", NewNFS41VolumeAdd(), NewNFS41VolumeRemove(),
+         NewNFS41VolumeList(), nullptr,
+         ParamNamespace("Operations on volume parameters of NFS v4.1 filesystems.", NewNFS41VolumeParamGet(),
+                        NewNFS41VolumeParamSet()),
+         FirewallNamespace("Operations on IP/Mask of nfs41Client firewall ruleset", NewNFS41FirewallAdd(),
+                           NewNFS41FirewallRemove(), NewNFS41FirewallList())});
 }
 
 } // namespace OrvaneCli::FileSystem

@@ -31,25 +31,18 @@ NetworkFileSystem::SecurityType ToSecurityType(const std::string& flavour)
 const CommandDecl kNFS41VolumeAddDecl = {
     .description = "Add a new NFS v4.1 volume to the Zephal Host and mount it with the given volume name.",
     .parameters = {
-        {.name = kOptionHostKnxnic,
-         .shortName = "I",
-         .type = ParameterType::StringList,
-         .description = "The hostname or IP address followed by a colon(:) and knxnic name. This parameter can be "
-                        "specified more than once. E.g.: --host-knxnic=host1:knxnic1 --host-knxnic=ip2:knxnic2",
-         .feature = Feature::Nfs41KnxnicBinding},
-        {.name = kHosts,
-         .shortName = "H",
-         .type = ParameterType::StringList,
-         .description = "The hostname(s) or IP address(es) (comma-separated) of the server for the NFS v4.1 volume to "
+        ServerKnxnicParameter(
+            ParameterType::StringList,
+            "The hostname or IP address followed by a colon(:) and knxnic name. This parameter can be "
+            "specified more than once. E.g.: --host-knxnic=host1:knxnic1 --host-knxnic=ip2:knxnic2",
+            Feature::Nfs41KnxnicBinding),
+        ServerParameter(kHosts, ParameterType::StringList,
+                        "The hostname(s) or IP address(es) (comma-separated) of the server for the NFS v4.1 volume to "
                         "add and mount on the system.",
-         .requiredUnless = Feature::Nfs41KnxnicBinding},
+                        Feature::Nfs41KnxnicBinding),
         {NfsAddArg::kIsPE, "p", ParameterType::Flag, "If set, this flag will set the mount point to be PE."},
-        {NfsAddArg::kShare, "s", ParameterType::String,
-         "The share name on the remote system to use for this NFS v4.1 mount point.", true},
-        {kOptionVolumeName, "v", ParameterType::String,
-         "The volume name to use for the NFS v4.1 mount.  This must be a unique volume name and cannot conflict with "
-         "existing NAS, NFS v4.1, HLFS, or other volume names.",
-         true},
+        ShareParameter("NFS v4.1"),
+        VolumeNameParameter("NFS v4.1", "NAS, NFS v4.1, HLFS, or other"),
         {NfsAddArg::kReadOnly, "r", ParameterType::Flag, "If set, this flag will make the mount point be read-only."},
         {kSecurity, "a", ParameterType::String, "Security flavors. Acceptable values are: %ENUM%.", false,
          StringEnum({{NetworkFileSystem::NFS_AUTH_SYS_STR.c_str(), "Authentication based on traditional UNIX ID"},

@@ -48,23 +48,15 @@ std::optional<NfsServer> ReadServer(const InputPtr& in, const OutputPtr& out)
 const CommandDecl kNFSVolumeAddDecl = {
     .description = "Add a new NAS volume to the Zephal Host and mount it with the given volume name.",
     .parameters = {
-        {.name = kHost,
-         .shortName = "H",
-         .type = ParameterType::String,
-         .description = "The hostname or IP address of the NAS volume to add and mount on the system.",
-         .requiredUnless = Feature::NfsKnxnicBinding},
-        {.name = kOptionHostKnxnic,
-         .shortName = "I",
-         .type = ParameterType::String,
-         .description = "The hostname or IP address of the NAS volume to add, followed by a colon(:) and knxnic name "
-                        "i.e. <host/IP>:<knxnic> ",
-         .feature = Feature::NfsKnxnicBinding},
-        {NfsAddArg::kShare, "s", ParameterType::String,
-         "The share name on the remote system to use for this NAS mount point.", true},
-        {kOptionVolumeName, "v", ParameterType::String,
-         "The volume name to use for the NAS mount.  This must be a unique volume name and cannot conflict with "
-         "existing NAS, HLFS or other volume names.",
-         true},
+        ServerParameter(kHost, ParameterType::String,
+                        "The hostname or IP address of the NAS volume to add and mount on the system.",
+                        Feature::NfsKnxnicBinding),
+        ServerKnxnicParameter(ParameterType::String,
+                              "The hostname or IP address of the NAS volume to add, followed by a colon(:) and knxnic "
+                              "name i.e. <host/IP>:<knxnic> ",
+                              Feature::NfsKnxnicBinding),
+        ShareParameter("NAS"),
+        VolumeNameParameter("NAS", "NAS, HLFS or other"),
         {kOptionConnections, "c", ParameterType::Int,
          "The number of RPC connections to be established for the NFS datastore. Minimum and default values are 1 "
          "and maximum is 8. A higher number of connections yields better performance on datastores with higher IO "

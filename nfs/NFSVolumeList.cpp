@@ -96,15 +96,9 @@ void FillRow(NetworkFileSystem& volume, const RowShape& shape, Row& row)
         row.Set(kHost, volume.GetRemoteHost());
     }
     row.Set(kShare, volume.GetRemoteShare());
-    if (shape.Has(kKnxnic)) {
-        row.Set(kKnxnic, volume.GetKnxnic());
-    }
-    if (shape.Has(kKnxnics)) {
-        row.Set(kKnxnics, volume.GetKnxnics());
-    }
-    if (shape.Has(kConnections)) {
-        row.Set(kConnections, static_cast<long>(volume.GetConnections()));
-    }
+    row.SetIfPresent(kKnxnic, [&] { return volume.GetKnxnic(); })
+        .SetIfPresent(kKnxnics, [&] { return volume.GetKnxnics(); })
+        .SetIfPresent(kConnections, [&] { return static_cast<long>(volume.GetConnections()); });
     row.Set(kAccessible, volume.IsAccessible());
     row.Set(kMounted, volume.IsMounted());
     row.Set(kReadOnly, v41 ? volume.GetReadOnlyState() : volume.IsReadOnly());

@@ -1,3 +1,4 @@
+#include <initializer_list>
 #include <vector>
 
 #include "command/Selection.h"
@@ -35,24 +36,27 @@ enum Field {
     kConnectionsField
 };
 
+// The columns of both versions, then `own`, the version's own ones.
+std::vector<Column> ParamColumns(std::initializer_list<Column> own)
+{
+    std::vector<Column> columns = {
+        {kVolumeNameField, "Volume Name"},
+        {kMaxQueueDepthField, "MaxQueueDepth", ColumnType::Int},
+        {kMaxReadField, "MaxReadTransferSize", ColumnType::Int},
+        {kMaxWriteField, "MaxWriteTransferSize", ColumnType::Int},
+    };
+    columns.insert(columns.end(), own);
+    return columns;
+}
+
 const ColumnTable kV3Columns(
-    "NasMountParams", {
-                          {kVolumeNameField, "Volume Name"},
-                          {kMaxQueueDepthField, "MaxQueueDepth", ColumnType::Int},
-                          {kMaxReadField, "MaxReadTransferSize", ColumnType::Int},
-                          {kMaxWriteField, "MaxWriteTransferSize", ColumnType::Int},
-                          {kKnxnicField, "Knxnic", ColumnType::String, {.feature = Feature::NfsKnxnicBinding}},
-                          {kConnectionsField, "Connections", ColumnType::Int, {.feature = Feature::NfsConnections}},
-                      });
+    "NasMountParams",
+    ParamColumns({{kKnxnicField, "Knxnic", ColumnType::String, {.feature = Feature::NfsKnxnicBinding}},
+                  {kConnectionsField, "Connections", ColumnType::Int, {.feature = Feature::NfsConnections}}}));
 
 const ColumnTable kV41Columns(
-    "NasMountParams", {
-                          {kVolumeNameField, "Volume Name"},
-                          {kMaxQueueDepthField, "MaxQueueDepth", ColumnType::Int},
-                          {kMaxReadField, "MaxReadTransferSize", ColumnType::Int},
-                          {kMaxWriteField, "MaxWriteTransferSize", ColumnType::Int},
-                          {kKnxnicsField, "Knxnics", ColumnType::String, {.feature = Feature::Nfs41KnxnicBinding}},
-                      });
+    "NasMountParams",
+    ParamColumns({{kKnxnicsField, "Knxnics", ColumnType::String, {.feature = Feature::Nfs41KnxnicBinding}}}));
 
 // Rows of the non-PE volumes named `name` (only the first that could be read), or of every
 // one for "all". `fillExtras` sets the fields after the sizes. A volume's name is read outside
@@ -140,18 +144,12 @@ class NfsParamGet final : public StorageCommand {
     {
         const RowShape shape = Rows();
         const VolumeQuery query = kVersion == HostCtl::Storage::NFS_VERSION_41 ? NonPEV41Volumes : NonPEV3Volumes;
-        ListVolumeParams(in->GetParameter(kOptionVolumeName), query, shape, out,
-                         [&](NetworkFileSystem& volume, Row& row) {
-                             if (shape.Has(kKnxnicField)) {
-                                 row.Set(kKnxnicField, volume.GetKnxnics());
-                             }
-                             if (shape.Has(kKnxnicsField)) {
-                                 row.Set(kKnxnicsField, volume.GetKnxnics());
-                             }
-                             if (shape.Has(kConnectionsField)) {
-                                 row.Set(kConnectionsField, static_cast<long>(volume.GetConnectionsParam()));
-                             }
-                         });
+        ListVolumeParams(
+            in->GetParameter(kOptionVolumeName), query, shape, out, [&](NetworkFileSystem& volume, Row& row) {
+                row.SetIfPresent(kKnxnicField, [&] { return volume.GetKnxnics(); })
+                    .SetIfPresent(kKnxnicsField, [&] { return volume.GetKnxnics(); })
+                    .SetIfPresent(kConnectionsField, [&] { return static_cast<long>(volume.GetConnectionsParam()); });
+            });
     }
 };
 

@@ -16,6 +16,16 @@ inline constexpr const char* kReadOnly = "readonly";
 inline constexpr const char* kIsPE = "ispe";
 } // namespace NfsAddArg
 
+// The server is named by a host parameter (`name`, -H) or, while the knxnic `binding`
+// switch is on, by host-knxnic (-I); the host parameter is required only while it is off.
+ParameterDecl ServerParameter(const char* name, ParameterType type, const char* description, Feature binding);
+ParameterDecl ServerKnxnicParameter(ParameterType type, const char* description, Feature binding);
+
+// share (-s) and volume-name (-v), both required. `kind` names the mount ("NAS") and
+// `others` the volume kinds a new name must not clash with.
+ParameterDecl ShareParameter(const char* kind);
+ParameterDecl VolumeNameParameter(const char* kind, const char* others);
+
 // Mount flags word of NetworkFileSystem::Mount.
 inline constexpr unsigned kNfsMountNoFlags = 0;
 inline constexpr unsigned kNfsMountRetry = 4;

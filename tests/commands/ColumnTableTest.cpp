@@ -92,6 +92,30 @@ TEST(ColumnTableTest, FillingAFieldTheShapeDoesNotHaveThrows)
     }
 }
 
+TEST(ColumnTableTest, SetIfPresentAsksOnlyForColumnsTheShapeHas)
+{
+    for (const bool on : {true, false}) {
+        SCOPED_TRACE(on ? "switch on" : "switch off");
+        TestSupport::ScopedHost host(on ? R"({"features": {"104": true}})" : R"({"features": {"104": false}})");
+        const RowShape shape = kTable.Shape();
+        Row row = shape.NewRow();
+        int reads = 0;
+        row.SetIfPresent(kBinding,
+                         [&] {
+                             ++reads;
+                             return std::string("knx0");
+                         })
+            .SetIfPresent(kSize, [&] {
+                ++reads;
+                return 7L;
+            });
+        EXPECT_EQ(reads, on ? 2 : 1);
+        EXPECT_EQ(Titles(*row.Structure()), Titles(*shape.Empty()));
+        // A wrong type is still refused when the column is there.
+        EXPECT_THROW(row.SetIfPresent(kSize, [] { return true; }), std::logic_error);
+    }
+}
+
 TEST(ColumnTableTest, BrokenTablesAreRefused)
 {
     TestSupport::ScopedHost host("{}");
