@@ -1,5 +1,6 @@
 #include "quillets/CallSpec.h"
 
+#include "framework/Words.h"
 #include "quillets/QuilletException.h"
 
 namespace Quillets::CallSpec {
@@ -81,22 +82,7 @@ namespace {
 constexpr unsigned Bit(ParameterType type) { return 1U << static_cast<unsigned>(type); }
 constexpr unsigned kAnyType = ~0U;
 
-const char* TypeName(ParameterType type)
-{
-    switch (type) {
-    case ParameterType::String:
-        return "a string";
-    case ParameterType::Int:
-        return "an integer";
-    case ParameterType::Bool:
-        return "a boolean";
-    case ParameterType::Flag:
-        return "a flag";
-    case ParameterType::StringList:
-        return "a string list";
-    }
-    return "an unknown type";
-}
+const char* TypeName(ParameterType type) { return Cli::WordsFor(type).described; }
 
 } // namespace
 

@@ -4,6 +4,7 @@
 
 #include "framework/GlobalOptions.h"
 #include "framework/Text.h"
+#include "framework/Words.h"
 
 namespace Quillets::Cli {
 
@@ -35,32 +36,11 @@ std::string TwoColumns(const std::vector<std::pair<std::string, std::string>>& r
     return out;
 }
 
-const char* ValueSyntax(ParameterType type)
-{
-    switch (type) {
-    case ParameterType::Int:
-        return " <long>";
-    case ParameterType::Bool:
-        return " <bool>";
-    case ParameterType::Flag:
-        return "";
-    case ParameterType::StringList:
-        return " <str>[,<str>...]";
-    default:
-        return " <str>";
-    }
-}
-
+// A field's declared kind as result help names it.
 const char* TypeName(MetaType type)
 {
-    switch (type) {
-    case MetaType::Bool:
-        return "boolean";
-    case MetaType::Int:
-        return "integer";
-    default:
-        return "string";
-    }
+    static constexpr Spelling<MetaType> kNames[] = {{MetaType::Bool, "boolean"}, {MetaType::Int, "integer"}};
+    return WordFor(kNames, type, "string");
 }
 
 std::string GlobalOptionsHelp()
@@ -176,7 +156,7 @@ std::string CommandHelp(const CommandPath& path, Command& command)
         std::vector<std::pair<std::string, std::string>> rows;
         for (const auto& parameter : input->GetParameters()) {
             std::string synopsis = parameter->GetShortName().empty() ? "" : "-" + parameter->GetShortName() + "|";
-            synopsis += "--" + parameter->GetName() + ValueSyntax(parameter->GetType());
+            synopsis += "--" + parameter->GetName() + WordsFor(parameter->GetType()).synopsis;
             rows.emplace_back(synopsis, ParameterDetails(*parameter));
             const auto& constraint = parameter->GetConstraint();
             if (constraint && constraint->GetType() == ParameterConstraintType::StringEnum) {

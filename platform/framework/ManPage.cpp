@@ -9,6 +9,7 @@
 #include "framework/Render.h"
 #include "framework/Text.h"
 #include "framework/TreeWalk.h"
+#include "framework/Words.h"
 #include "quillets/CallSpec.h"
 #include "quillets/MetaObj.h"
 
@@ -16,7 +17,6 @@ namespace Quillets::Cli {
 
 using AutoCli::Command;
 using CallSpec::ParameterConstraintType;
-using CallSpec::ParameterType;
 
 namespace {
 
@@ -36,22 +36,6 @@ std::string Section(const std::string& title) { return ".SH " + title + "\n"; }
 std::string Tagged(const std::string& tag, const std::string& body)
 {
     return ".TP\n" + tag + "\n" + RoffText(body) + "\n";
-}
-
-const char* ValueName(ParameterType type)
-{
-    switch (type) {
-    case ParameterType::Int:
-        return "long";
-    case ParameterType::Bool:
-        return "bool";
-    case ParameterType::Flag:
-        return "";
-    case ParameterType::StringList:
-        return "str[,str...]";
-    default:
-        return "str";
-    }
 }
 
 std::string OptionsSection()
@@ -103,7 +87,7 @@ std::string CommandSection(const CommandPath& path, Command& command)
         }
         std::string tag = parameter->GetShortName().empty() ? "" : Bold("-" + parameter->GetShortName()) + ", ";
         tag += Bold("--" + parameter->GetName());
-        if (const std::string value = ValueName(parameter->GetType()); !value.empty()) {
+        if (const std::string value = WordsFor(parameter->GetType()).manValue; !value.empty()) {
             tag += " " + Italic(value);
         }
         out += Tagged(tag, ParameterDetails(*parameter));

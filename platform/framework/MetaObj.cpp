@@ -10,37 +10,32 @@ namespace Quillets::MetaObj {
 
 MetaObject::~MetaObject() = default;
 
-std::shared_ptr<MetaBool> MetaBool::New() { return std::make_shared<MetaBool>(); }
+namespace {
 
-std::shared_ptr<MetaBool> MetaBool::New(bool value)
+// A new scalar holding `value`; each class passes its own field, so this one place fills them all.
+template <class Meta, class Field, class Value>
+std::shared_ptr<Meta> Holding(Field Meta::*field, Value value)
 {
-    auto object = std::make_shared<MetaBool>();
-    object->value_ = value;
+    auto object = std::make_shared<Meta>();
+    (*object).*field = std::move(value);
     return object;
 }
 
+} // namespace
+
+std::shared_ptr<MetaBool> MetaBool::New() { return std::make_shared<MetaBool>(); }
+std::shared_ptr<MetaBool> MetaBool::New(bool value) { return Holding(&MetaBool::value_, value); }
 MetaType MetaBool::GetType() const { return MetaType::Bool; }
 
 std::shared_ptr<MetaInt> MetaInt::New() { return std::make_shared<MetaInt>(); }
-
-std::shared_ptr<MetaInt> MetaInt::New(long value)
-{
-    auto object = std::make_shared<MetaInt>();
-    object->value_ = value;
-    return object;
-}
-
+std::shared_ptr<MetaInt> MetaInt::New(long value) { return Holding(&MetaInt::value_, value); }
 MetaType MetaInt::GetType() const { return MetaType::Int; }
 
 std::shared_ptr<MetaString> MetaString::New() { return std::make_shared<MetaString>(); }
-
 std::shared_ptr<MetaString> MetaString::New(std::string value)
 {
-    auto object = std::make_shared<MetaString>();
-    object->value_ = std::move(value);
-    return object;
+    return Holding(&MetaString::value_, std::move(value));
 }
-
 MetaType MetaString::GetType() const { return MetaType::String; }
 
 // Structure names and field titles, each kept once for the life of the process (the table

@@ -557,10 +557,10 @@ Invocation ParseCommandLine(const std::shared_ptr<NamespaceNode>& root, const st
         inv.node = child;
         if (auto command = std::dynamic_pointer_cast<Command>(child)) {
             inv.command = command;
-            auto spec = command->GetInputSpec();
+            auto declared = command->GetInputSpec();
             inv.input = Input::New();
-            inv.input->Declare(spec, JoinPath(inv.path));
-            parameters.emplace(std::move(spec), inv.input);
+            inv.input->Declare(declared, JoinPath(inv.path));
+            parameters.emplace(std::move(declared), inv.input);
         }
     }
 

@@ -7,6 +7,7 @@
 
 #include "framework/Suggest.h"
 #include "framework/Text.h"
+#include "framework/Words.h"
 
 namespace Quillets::Cli {
 
@@ -20,34 +21,9 @@ using MetaObj::MetaType;
 
 std::optional<Formatter> ParseFormatter(const std::string& name)
 {
-    if (name == "table") {
-        return Formatter::Table;
-    }
-    if (name == "simple") {
-        return Formatter::Simple;
-    }
-    if (name == "json") {
-        return Formatter::Json;
-    }
-    if (name == "csv") {
-        return Formatter::Csv;
-    }
-    return std::nullopt;
-}
-
-const char* FormatterName(Formatter formatter)
-{
-    switch (formatter) {
-    case Formatter::Table:
-        return "table";
-    case Formatter::Simple:
-        return "simple";
-    case Formatter::Json:
-        return "json";
-    case Formatter::Csv:
-        return "csv";
-    }
-    return "simple";
+    static constexpr Spelling<Formatter> kNames[] = {
+        {Formatter::Table, "table"}, {Formatter::Simple, "simple"}, {Formatter::Json, "json"}, {Formatter::Csv, "csv"}};
+    return ValueFor(kNames, name);
 }
 
 Formatter EffectiveFormatter(const OutputHints& hints, const OutputOptions& options)

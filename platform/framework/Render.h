@@ -22,7 +22,6 @@ enum class Formatter { Table, Simple, Json, Csv };
 
 // "table", "simple", "json" or "csv"; nothing for any other name.
 std::optional<Formatter> ParseFormatter(const std::string& name);
-const char* FormatterName(Formatter formatter);
 
 // What the command declared about its presentation (CommandSpec's defaults).
 struct OutputHints {

@@ -66,28 +66,38 @@ void Journal(const std::string& command, const std::string& input)
     ::close(fd);
 }
 
-class Fd {
+// One pipe to the child; each end is closed as soon as this side is done with it, and
+// whatever is still open goes when the exchange ends.
+class Pipe {
 public:
-    explicit Fd(int fd = -1) : fd_(fd) {}
-    ~Fd() { Close(); }
-    Fd(const Fd&) = delete;
-    Fd& operator=(const Fd&) = delete;
-    int Get() const { return fd_; }
-    void Reset(int fd)
+    Pipe()
     {
-        Close();
-        fd_ = fd;
-    }
-    void Close()
-    {
-        if (fd_ >= 0) {
-            ::close(fd_);
-            fd_ = -1;
+        if (::pipe2(ends_, O_CLOEXEC) != 0) {
+            ends_[0] = ends_[1] = -1;
         }
     }
+    ~Pipe()
+    {
+        CloseRead();
+        CloseWrite();
+    }
+    Pipe(const Pipe&) = delete;
+    Pipe& operator=(const Pipe&) = delete;
+    bool Open() const { return ends_[0] >= 0; }
+    int Read() const { return ends_[0]; }
+    int Write() const { return ends_[1]; }
+    void CloseRead() { Close(ends_[0]); }
+    void CloseWrite() { Close(ends_[1]); }
 
 private:
-    int fd_;
+    static void Close(int& fd)
+    {
+        if (fd >= 0) {
+            ::close(fd);
+            fd = -1;
+        }
+    }
+    int ends_[2] = {-1, -1};
 };
 
 // Writing to a child that stopped reading must not kill this process: SIGPIPE is
@@ -123,17 +133,6 @@ private:
     bool raised_ = false;
 };
 
-bool MakePipe(Fd& readEnd, Fd& writeEnd)
-{
-    int fds[2];
-    if (::pipe2(fds, O_CLOEXEC) != 0) {
-        return false;
-    }
-    readEnd.Reset(fds[0]);
-    writeEnd.Reset(fds[1]);
-    return true;
-}
-
 } // namespace
 
 int AutoCli_ShellCmd(const std::string& command, std::string& output, const std::string& input)
@@ -145,8 +144,12 @@ int AutoCli_ShellCmd(const std::string& command, std::string& output, const std:
     }
     Journal(command, input);
 
-    Fd inRead, inWrite, outRead, outWrite;
-    if (!MakePipe(inRead, inWrite) || !MakePipe(outRead, outWrite)) {
+    Pipe in;
+    if (!in.Open()) {
+        return -1;
+    }
+    Pipe out;
+    if (!out.Open()) {
         return -1;
     }
 
@@ -154,9 +157,9 @@ int AutoCli_ShellCmd(const std::string& command, std::string& output, const std:
     if (posix_spawn_file_actions_init(&actions) != 0) {
         return -1;
     }
-    posix_spawn_file_actions_adddup2(&actions, inRead.Get(), STDIN_FILENO);
-    posix_spawn_file_actions_adddup2(&actions, outWrite.Get(), STDOUT_FILENO);
-    posix_spawn_file_actions_adddup2(&actions, outWrite.Get(), STDERR_FILENO);
+    posix_spawn_file_actions_adddup2(&actions, in.Read(), STDIN_FILENO);
+    posix_spawn_file_actions_adddup2(&actions, out.Write(), STDOUT_FILENO);
+    posix_spawn_file_actions_adddup2(&actions, out.Write(), STDERR_FILENO);
 
     SigPipeGuard sigPipe;
     // The child starts with default signal handling and an empty mask.
@@ -176,25 +179,25 @@ int AutoCli_ShellCmd(const std::string& command, std::string& output, const std:
     const int spawned = posix_spawn(&pid, "/bin/sh", &actions, &attributes, const_cast<char* const*>(argv), environ);
     posix_spawn_file_actions_destroy(&actions);
     posix_spawnattr_destroy(&attributes);
-    inRead.Close();
-    outWrite.Close();
+    in.CloseRead();
+    out.CloseWrite();
     if (spawned != 0) {
         return -1;
     }
 
     // Feed the input and drain the output together, so that neither side can block the other.
-    ::fcntl(inWrite.Get(), F_SETFL, ::fcntl(inWrite.Get(), F_GETFL) | O_NONBLOCK);
+    ::fcntl(in.Write(), F_SETFL, ::fcntl(in.Write(), F_GETFL) | O_NONBLOCK);
     std::size_t written = 0;
     if (input.empty()) {
-        inWrite.Close();
+        in.CloseWrite();
     }
     char buffer[65536];
-    while (outRead.Get() >= 0) {
+    while (out.Read() >= 0) {
         pollfd fds[2];
         nfds_t count = 0;
-        fds[count++] = {outRead.Get(), POLLIN, 0};
-        if (inWrite.Get() >= 0) {
-            fds[count++] = {inWrite.Get(), POLLOUT, 0};
+        fds[count++] = {out.Read(), POLLIN, 0};
+        if (in.Write() >= 0) {
+            fds[count++] = {in.Write(), POLLOUT, 0};
         }
         if (::poll(fds, count, -1) < 0) {
             if (errno == EINTR) {
@@ -203,26 +206,26 @@ int AutoCli_ShellCmd(const std::string& command, std::string& output, const std:
             break;
         }
         if (count > 1 && fds[1].revents != 0) {
-            const ssize_t n = ::write(inWrite.Get(), input.data() + written, input.size() - written);
+            const ssize_t n = ::write(in.Write(), input.data() + written, input.size() - written);
             if (n > 0) {
                 written += static_cast<std::size_t>(n);
             } else if (n < 0 && errno == EPIPE) {
                 sigPipe.Raised();
             }
             if ((n < 0 && errno != EAGAIN && errno != EINTR) || written == input.size()) {
-                inWrite.Close();
+                in.CloseWrite();
             }
         }
         if (fds[0].revents != 0) {
-            const ssize_t n = ::read(outRead.Get(), buffer, sizeof buffer);
+            const ssize_t n = ::read(out.Read(), buffer, sizeof buffer);
             if (n > 0) {
                 output.append(buffer, static_cast<std::size_t>(n));
             } else if (n == 0 || (errno != EINTR && errno != EAGAIN)) {
-                outRead.Close();
+                out.CloseRead();
             }
         }
     }
-    inWrite.Close();
+    in.CloseWrite();
 
     int status = 0;
     while (::waitpid(pid, &status, 0) < 0) {
