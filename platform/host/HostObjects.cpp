@@ -429,9 +429,7 @@ namespace KnxCtl::Storage {
 
 namespace Ops = HostSim::Objects::FsOps;
 namespace Runtime = HostSim::Runtime;
-using HostSim::Model::FileSystemRecord;
-using HostSim::Model::FsKey;
-using HostSim::Model::FsKind;
+using namespace HostSim::Model;
 using HostSim::Objects::Change;
 using HostSim::Objects::OnFileSystem;
 using HostSim::Objects::ReadField;
