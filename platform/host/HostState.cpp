@@ -714,8 +714,7 @@ public:
 
     bool start_object(std::size_t)
     {
-        stack_.push_back(Place(json::value_t::object));
-        frames_.push_back(Frame{false, {}, 0});
+        Open(json::value_t::object);
         return true;
     }
     bool key(json::string_t& k)
@@ -728,25 +727,28 @@ public:
         slot_ = &(*stack_.back())[k];
         return true;
     }
-    bool end_object()
-    {
-        stack_.pop_back();
-        frames_.pop_back();
-        Completed();
-        return true;
-    }
+    bool end_object() { return Close(); }
     bool start_array(std::size_t)
     {
-        json* array = Place(json::value_t::array);
-        stack_.push_back(array);
-        frames_.push_back(Frame{true, {}, 0});
+        json* array = Open(json::value_t::array);
         if (stack_.size() == 2 && stack_[0]->is_object() && topKey_ == "fileSystems") {
             streamed_ = array;
             streamedCount_ = 0;
         }
         return true;
     }
-    bool end_array()
+    bool end_array() { return Close(); }
+
+    // Starts an object or array at the current place.
+    json* Open(json::value_t type)
+    {
+        json* container = Place(type);
+        stack_.push_back(container);
+        frames_.push_back(Frame{type == json::value_t::array, {}, 0});
+        return container;
+    }
+
+    bool Close()
     {
         stack_.pop_back();
         frames_.pop_back();
@@ -889,14 +891,7 @@ HlfsFields& DemoHlfs(Record& r, const char* lvmUuid, std::int32_t qaxiState, std
 User DemoUser(const char* heartbeatUuid, const char* mac, std::uint32_t major, std::uint32_t minor, std::int64_t offset,
               std::uint8_t lockModeInUse)
 {
-    User u;
-    u.heartbeatUuid = heartbeatUuid;
-    u.macAddress = mac;
-    u.driverVersionMajor = major;
-    u.driverVersionMinor = minor;
-    u.heartbeatOffset = offset;
-    u.lockModeInUse = lockModeInUse;
-    return u;
+    return {heartbeatUuid, mac, major, minor, offset, lockModeInUse};
 }
 
 State BuildDemo()
