@@ -17,26 +17,10 @@ using KnxCtl::Storage::UnresolvedHlfsVolumeImpl;
 
 namespace {
 
-// Changes one key of a file system; only a real change marks the state for saving.
-template <typename T, typename V>
-void Set(FileSystemRecord& record, T& field, const V& value, FsKey key)
-{
-    if (field == value)
-        return;
-    Runtime::MarkDirty();
-    field = value;
-    record.Mark(key);
-}
-
 template <typename F>
 auto OnUnresolved(const Handle& handle, std::string_view call, const J* args, F&& body)
 {
-    Runtime::JournalEntry entry{handle.name, args ? *args : J()};
-    return Runtime::Run(call, args ? &entry : nullptr, [&] {
-        UnresolvedVolume& record = ResolveUnresolved(handle);
-        Runtime::CheckFault(call, {record.volumeName, record.uuid});
-        return body(record);
-    });
+    return OnRecord<UnresolvedVolume>(handle, call, args, std::forward<F>(body));
 }
 
 template <typename F>
@@ -152,22 +136,27 @@ std::unique_ptr<HostCtl::Storage::UnresolvedHlfsVolume> MakeUnresolved(const Unr
     return std::make_unique<UnresolvedHlfsVolumeImpl>(MakeHandle(record));
 }
 
-FileSystemRecord& Resolve(const Handle& handle)
+namespace {
+
+// The record behind a handle, found by `find`; `what` names the volume in the message when
+// it has gone.
+template <typename Record>
+Record& ResolveRecord(const Handle& handle, Record* (*find)(std::uint64_t, std::size_t&), const char* what)
 {
     Runtime::CheckedState();
-    FileSystemRecord* record = Runtime::FindFileSystemById(handle.id, handle.position);
+    Record* record = find(handle.id, handle.position);
     if (!record)
-        Runtime::Throw("Volume '" + handle.name + "' no longer exists");
+        Runtime::Throw(what + (" '" + handle.name + "' no longer exists"));
     return *record;
 }
 
+} // namespace
+
+FileSystemRecord& Resolve(const Handle& handle) { return ResolveRecord(handle, Runtime::FindFileSystemById, "Volume"); }
+
 UnresolvedVolume& ResolveUnresolved(const Handle& handle)
 {
-    Runtime::CheckedState();
-    UnresolvedVolume* record = Runtime::FindUnresolvedById(handle.id, handle.position);
-    if (!record)
-        Runtime::Throw("Snapshot '" + handle.name + "' no longer exists");
-    return *record;
+    return ResolveRecord(handle, Runtime::FindUnresolvedById, "Snapshot");
 }
 
 const Model::UnresolvedExtent& ResolveUnresolvedExtent(const Handle& handle)
@@ -186,9 +175,9 @@ void Mount(const Handle& h, FileSystem::MountOperationOption option)
 {
     const J args = J::array({static_cast<int>(option)});
     OnFileSystem(h, "FileSystem.Mount", &args, [&](FileSystemRecord& r) {
-        Set(r, r.mounted, true, FsKey::mounted);
+        Change(r, r.mounted, true, FsKey::mounted);
         if (r.explicitlyUnmounted)
-            Set(r, r.explicitlyUnmounted, false, FsKey::explicitlyUnmounted);
+            Change(r, r.explicitlyUnmounted, false, FsKey::explicitlyUnmounted);
     });
 }
 
@@ -198,51 +187,36 @@ int Unmount(const Handle& h, FileSystem::MountOperationOption option)
     return OnFileSystem(h, "FileSystem.Unmount", &args, [&](FileSystemRecord& r) {
         if (r.busy)
             return 1;
-        Set(r, r.mounted, false, FsKey::mounted);
-        Set(r, r.explicitlyUnmounted, option == FileSystem::MOUNT_PERSISTENT, FsKey::explicitlyUnmounted);
+        Change(r, r.mounted, false, FsKey::mounted);
+        Change(r, r.explicitlyUnmounted, option == FileSystem::MOUNT_PERSISTENT, FsKey::explicitlyUnmounted);
         return 0;
     });
 }
 
-bool IsMounted(const Handle& h)
-{
-    return OnFileSystem(h, "FileSystem.IsMounted", nullptr, [](FileSystemRecord& r) { return r.mounted; });
-}
+bool IsMounted(const Handle& h) { return ReadField<&FileSystemRecord::mounted>(h, "FileSystem.IsMounted"); }
 
 std::uint64_t GetCapacity(const Handle& h)
 {
-    return OnFileSystem(h, "FileSystem.GetCapacity", nullptr, [](FileSystemRecord& r) { return r.capacity; });
+    return ReadField<&FileSystemRecord::capacity>(h, "FileSystem.GetCapacity");
 }
 
-std::uint64_t GetUsedSpace(const Handle& h)
-{
-    return OnFileSystem(h, "FileSystem.GetUsedSpace", nullptr, [](FileSystemRecord& r) { return r.used; });
-}
+std::uint64_t GetUsedSpace(const Handle& h) { return ReadField<&FileSystemRecord::used>(h, "FileSystem.GetUsedSpace"); }
 
-std::string GetType(const Handle& h)
-{
-    return OnFileSystem(h, "FileSystem.GetType", nullptr, [](FileSystemRecord& r) { return r.type; });
-}
+std::string GetType(const Handle& h) { return ReadField<&FileSystemRecord::type>(h, "FileSystem.GetType"); }
 
 std::string GetMountPoint(const Handle& h)
 {
-    return OnFileSystem(h, "FileSystem.GetMountPoint", nullptr, [](FileSystemRecord& r) { return r.mountPoint; });
+    return ReadField<&FileSystemRecord::mountPoint>(h, "FileSystem.GetMountPoint");
 }
 
 std::string GetVolumeName(const Handle& h)
 {
-    return OnFileSystem(h, "FileSystem.GetVolumeName", nullptr, [](FileSystemRecord& r) { return r.volumeName; });
+    return ReadField<&FileSystemRecord::volumeName>(h, "FileSystem.GetVolumeName");
 }
 
-std::string GetUuid(const Handle& h)
-{
-    return OnFileSystem(h, "FileSystem.GetUuid", nullptr, [](FileSystemRecord& r) { return r.uuid; });
-}
+std::string GetUuid(const Handle& h) { return ReadField<&FileSystemRecord::uuid>(h, "FileSystem.GetUuid"); }
 
-std::string GetName(const Handle& h)
-{
-    return OnFileSystem(h, "FileSystem.GetName", nullptr, [](FileSystemRecord& r) { return r.name; });
-}
+std::string GetName(const Handle& h) { return ReadField<&FileSystemRecord::name>(h, "FileSystem.GetName"); }
 
 void PrepareUnmount(const Handle& h)
 {
@@ -278,18 +252,17 @@ void NetworkFileSystemObject::Mount(unsigned flags)
         if (found == exports.end())
             Runtime::Throw("Unable to connect to NFS server " + (hosts.empty() ? std::string() : hosts.front()) + ":" +
                            nfs.remoteShare);
-        Set(r, r.mounted, true, FsKey::mounted);
+        Change(r, r.mounted, true, FsKey::mounted);
         if (r.explicitlyUnmounted)
-            Set(r, r.explicitlyUnmounted, false, FsKey::explicitlyUnmounted);
-        Set(r, r.capacity, found->capacity, FsKey::capacity);
-        Set(r, r.used, found->used, FsKey::used);
+            Change(r, r.explicitlyUnmounted, false, FsKey::explicitlyUnmounted);
+        Change(r, r.capacity, found->capacity, FsKey::capacity);
+        Change(r, r.used, found->used, FsKey::used);
     });
 }
 
 bool NetworkFileSystemObject::IsAccessible()
 {
-    return OnFileSystem(handle(), "NetworkFileSystem.IsAccessible", nullptr,
-                        [](FileSystemRecord& r) { return r.accessible; });
+    return ReadField<&FileSystemRecord::accessible>(handle(), "NetworkFileSystem.IsAccessible");
 }
 
 std::string NetworkFileSystemObject::GetRemoteHost()
@@ -312,20 +285,17 @@ std::vector<std::string> NetworkFileSystemObject::GetRemoteHosts()
 
 std::string NetworkFileSystemObject::GetRemoteShare()
 {
-    return OnFileSystem(handle(), "NetworkFileSystem.GetRemoteShare", nullptr,
-                        [](FileSystemRecord& r) { return r.Nfs().remoteShare; });
+    return ReadField<&Model::NfsFields::remoteShare>(handle(), "NetworkFileSystem.GetRemoteShare");
 }
 
 bool NetworkFileSystemObject::IsReadOnly()
 {
-    return OnFileSystem(handle(), "NetworkFileSystem.IsReadOnly", nullptr,
-                        [](FileSystemRecord& r) { return r.Nfs().readOnly; });
+    return ReadField<&Model::NfsFields::readOnly>(handle(), "NetworkFileSystem.IsReadOnly");
 }
 
 bool NetworkFileSystemObject::GetReadOnlyState()
 {
-    return OnFileSystem(handle(), "NetworkFileSystem.GetReadOnlyState", nullptr,
-                        [](FileSystemRecord& r) { return r.Nfs().readOnlyState; });
+    return ReadField<&Model::NfsFields::readOnlyState>(handle(), "NetworkFileSystem.GetReadOnlyState");
 }
 
 void NetworkFileSystemObject::SetReadOnly(bool readOnly)
@@ -333,85 +303,69 @@ void NetworkFileSystemObject::SetReadOnly(bool readOnly)
     const J args = J::array({readOnly});
     OnFileSystem(handle(), "NetworkFileSystem.SetReadOnly", &args, [&](FileSystemRecord& r) {
         auto& nfs = r.MutableNfs();
-        Set(r, nfs.readOnly, readOnly, FsKey::readOnly);
-        Set(r, nfs.readOnlyState, readOnly, FsKey::readOnlyState);
+        Change(r, nfs.readOnly, readOnly, FsKey::readOnly);
+        Change(r, nfs.readOnlyState, readOnly, FsKey::readOnlyState);
     });
 }
 
-bool NetworkFileSystemObject::IsPE()
-{
-    return OnFileSystem(handle(), "NetworkFileSystem.IsPE", nullptr, [](FileSystemRecord& r) { return r.Nfs().isPE; });
-}
+bool NetworkFileSystemObject::IsPE() { return ReadField<&Model::NfsFields::isPE>(handle(), "NetworkFileSystem.IsPE"); }
 
 void NetworkFileSystemObject::SetPE(bool isPE)
 {
-    const J args = J::array({isPE});
-    OnFileSystem(handle(), "NetworkFileSystem.SetPE", &args,
-                 [&](FileSystemRecord& r) { Set(r, r.MutableNfs().isPE, isPE, FsKey::isPE); });
+    WriteField<&Model::NfsFields::isPE>(handle(), "NetworkFileSystem.SetPE", FsKey::isPE, isPE);
 }
 
 std::string NetworkFileSystemObject::GetKnxnic()
 {
-    return OnFileSystem(handle(), "NetworkFileSystem.GetKnxnic", nullptr,
-                        [](FileSystemRecord& r) { return r.Nfs().knxnic; });
+    return ReadField<&Model::NfsFields::knxnic>(handle(), "NetworkFileSystem.GetKnxnic");
 }
 
 std::string NetworkFileSystemObject::GetKnxnics()
 {
-    return OnFileSystem(handle(), "NetworkFileSystem.GetKnxnics", nullptr,
-                        [](FileSystemRecord& r) { return r.Nfs().knxnics; });
+    return ReadField<&Model::NfsFields::knxnics>(handle(), "NetworkFileSystem.GetKnxnics");
 }
 
 void NetworkFileSystemObject::SetKnxnics(const std::string& knxnics)
 {
-    const J args = J::array({knxnics});
-    OnFileSystem(handle(), "NetworkFileSystem.SetKnxnics", &args,
-                 [&](FileSystemRecord& r) { Set(r, r.MutableNfs().knxnics, knxnics, FsKey::knxnics); });
+    WriteField<&Model::NfsFields::knxnics>(handle(), "NetworkFileSystem.SetKnxnics", FsKey::knxnics, knxnics);
 }
 
 std::int64_t NetworkFileSystemObject::GetConnections()
 {
-    return OnFileSystem(handle(), "NetworkFileSystem.GetConnections", nullptr,
-                        [](FileSystemRecord& r) { return r.Nfs().connections; });
+    return ReadField<&Model::NfsFields::connections>(handle(), "NetworkFileSystem.GetConnections");
 }
 
 std::int32_t NetworkFileSystemObject::GetConnectionsParam()
 {
-    return OnFileSystem(handle(), "NetworkFileSystem.GetConnectionsParam", nullptr,
-                        [](FileSystemRecord& r) { return r.Nfs().connectionsParam; });
+    return ReadField<&Model::NfsFields::connectionsParam>(handle(), "NetworkFileSystem.GetConnectionsParam");
 }
 
 void NetworkFileSystemObject::SetConnectionsParam(std::int32_t connections)
 {
-    const J args = J::array({connections});
-    OnFileSystem(handle(), "NetworkFileSystem.SetConnectionsParam", &args, [&](FileSystemRecord& r) {
-        Set(r, r.MutableNfs().connectionsParam, connections, FsKey::connectionsParam);
-    });
+    WriteField<&Model::NfsFields::connectionsParam>(handle(), "NetworkFileSystem.SetConnectionsParam",
+                                                    FsKey::connectionsParam, connections);
 }
 
 std::uint32_t NetworkFileSystemObject::GetMaxReadTransferSize()
 {
-    return OnFileSystem(handle(), "NetworkFileSystem.GetMaxReadTransferSize", nullptr,
-                        [](FileSystemRecord& r) { return r.Nfs().maxReadTransferSize; });
+    return ReadField<&Model::NfsFields::maxReadTransferSize>(handle(), "NetworkFileSystem.GetMaxReadTransferSize");
 }
 
 std::uint32_t NetworkFileSystemObject::GetMaxWriteTransferSize()
 {
-    return OnFileSystem(handle(), "NetworkFileSystem.GetMaxWriteTransferSize", nullptr,
-                        [](FileSystemRecord& r) { return r.Nfs().maxWriteTransferSize; });
+    return ReadField<&Model::NfsFields::maxWriteTransferSize>(handle(), "NetworkFileSystem.GetMaxWriteTransferSize");
 }
 
 std::uint32_t NetworkFileSystemObject::GetMaxQueueDepth()
 {
-    return OnFileSystem(handle(), "NetworkFileSystem.GetMaxQueueDepth", nullptr,
-                        [](FileSystemRecord& r) { return r.Nfs().maxQueueDepth; });
+    return ReadField<&Model::NfsFields::maxQueueDepth>(handle(), "NetworkFileSystem.GetMaxQueueDepth");
 }
 
 void NetworkFileSystemObject::SetMaxQueueDepth(std::uint32_t depth, bool apply)
 {
     const J args = J::array({depth, apply});
     OnFileSystem(handle(), "NetworkFileSystem.SetMaxQueueDepth", &args,
-                 [&](FileSystemRecord& r) { Set(r, r.MutableNfs().maxQueueDepth, depth, FsKey::maxQueueDepth); });
+                 [&](FileSystemRecord& r) { Change(r, r.MutableNfs().maxQueueDepth, depth, FsKey::maxQueueDepth); });
 }
 
 NetworkFileSystem::SecurityType NetworkFileSystemObject::GetSecurityType()
@@ -422,23 +376,30 @@ NetworkFileSystem::SecurityType NetworkFileSystemObject::GetSecurityType()
 
 bool NetworkFileSystemObject::IsHidden()
 {
-    return OnFileSystem(handle(), "NetworkFileSystem.IsHidden", nullptr,
-                        [](FileSystemRecord& r) { return r.Nfs().hidden; });
+    return ReadField<&Model::NfsFields::hidden>(handle(), "NetworkFileSystem.IsHidden");
 }
 
 // ---- extents ------------------------------------------------------------------------------
 
 namespace {
 
+// The extent record behind an extent object's handle; throws when it has gone.
+const Model::Extent& ResolveExtent(const Handle& handle, ExtentSource source)
+{
+    if (source == ExtentSource::Unresolved)
+        return ResolveUnresolvedExtent(handle);
+    const FileSystemRecord& volume = Resolve(handle);
+    const auto& extents = volume.Hlfs().extents;
+    if (handle.extent < 0 || static_cast<std::size_t>(handle.extent) >= extents.size())
+        Runtime::Throw("Extent of volume '" + handle.name + "' no longer exists");
+    return extents[static_cast<std::size_t>(handle.extent)];
+}
+
 template <typename F>
-auto OnLunPartition(const Handle& handle, std::string_view call, F&& body)
+auto OnExtent(const Handle& handle, ExtentSource source, std::string_view call, F&& body)
 {
     return Runtime::Run(call, nullptr, [&] {
-        const FileSystemRecord& volume = Resolve(handle);
-        const auto& extents = volume.Hlfs().extents;
-        if (handle.extent < 0 || static_cast<std::size_t>(handle.extent) >= extents.size())
-            Runtime::Throw("Extent of volume '" + handle.name + "' no longer exists");
-        const Model::Extent& extent = extents[static_cast<std::size_t>(handle.extent)];
+        const Model::Extent& extent = ResolveExtent(handle, source);
         Runtime::CheckFault(call, {extent.deviceName});
         return body(extent);
     });
@@ -446,34 +407,19 @@ auto OnLunPartition(const Handle& handle, std::string_view call, F&& body)
 
 } // namespace
 
-LunPartitionObject::~LunPartitionObject() = default;
-
-std::string LunPartitionObject::GetDeviceName()
+std::string ExtentDeviceName(const Handle& handle, ExtentSource source)
 {
-    return OnLunPartition(*handle_, "DiskLunPartition.GetDeviceName",
-                          [](const Model::Extent& e) { return e.deviceName; });
+    return OnExtent(handle, source, "DiskLunPartition.GetDeviceName",
+                    [](const Model::Extent& e) { return e.deviceName; });
 }
 
-std::uint8_t LunPartitionObject::GetPartition()
+std::uint8_t ExtentPartition(const Handle& handle, ExtentSource source)
 {
-    return OnLunPartition(*handle_, "DiskLunPartition.GetPartition",
-                          [](const Model::Extent& e) { return e.partition; });
+    return OnExtent(handle, source, "DiskLunPartition.GetPartition",
+                    [](const Model::Extent& e) { return e.partition; });
 }
 
 ForeignUnresolvedVolume::~ForeignUnresolvedVolume() = default;
-ForeignUnresolvedExtent::~ForeignUnresolvedExtent() = default;
-
-std::string ForeignUnresolvedExtent::GetDeviceName()
-{
-    return OnUnresolvedExtent(*handle_, "DiskLunPartition.GetDeviceName",
-                              [](const Model::UnresolvedExtent& e) { return e.deviceName; });
-}
-
-std::uint8_t ForeignUnresolvedExtent::GetPartition()
-{
-    return OnUnresolvedExtent(*handle_, "DiskLunPartition.GetPartition",
-                              [](const Model::UnresolvedExtent& e) { return e.partition; });
-}
 
 } // namespace HostSim::Objects
 
@@ -483,23 +429,15 @@ namespace KnxCtl::Storage {
 
 namespace Ops = HostSim::Objects::FsOps;
 namespace Runtime = HostSim::Runtime;
-using HostSim::Model::FileSystemRecord;
-using HostSim::Model::FsKey;
-using HostSim::Model::FsKind;
+using namespace HostSim::Model;
+using HostSim::Objects::Change;
 using HostSim::Objects::OnFileSystem;
+using HostSim::Objects::ReadField;
+using HostSim::Objects::WriteField;
+namespace Model = HostSim::Model;
 using J = nlohmann::ordered_json;
 
 namespace {
-
-template <typename T, typename V>
-void SetKey(FileSystemRecord& record, T& field, const V& value, FsKey key)
-{
-    if (field == value)
-        return;
-    Runtime::MarkDirty();
-    field = value;
-    record.Mark(key);
-}
 
 constexpr std::string_view kVolumesFolder = "/hlfs/volumes/";
 
@@ -535,6 +473,22 @@ HlFileSystemImpl::HlFileSystemImpl(const std::string& path)
     });
 }
 
+namespace {
+
+// The first volume `find` finds by `key` when it is an HLFS volume, as a new object, or none.
+std::unique_ptr<HlFileSystem> FindHlfs(std::string_view call, const std::string& key,
+                                       const FileSystemRecord* (*find)(std::string_view))
+{
+    return Runtime::Run(call, nullptr, [&]() -> std::unique_ptr<HlFileSystem> {
+        Runtime::CheckedState();
+        Runtime::CheckFault(call, {key});
+        const FileSystemRecord* r = find(key);
+        return r && r->kind == FsKind::Hlfs ? HostSim::Objects::MakeHlfs(*r) : nullptr;
+    });
+}
+
+} // namespace
+
 HlFileSystemImpl::HlFileSystemImpl(std::shared_ptr<HostObjectHandle> handle) : handle_(std::move(handle)) {}
 HlFileSystemImpl::~HlFileSystemImpl() = default;
 
@@ -542,24 +496,14 @@ std::unique_ptr<HlFileSystem> HlFileSystemImpl::GetHLFSFileSystemByLabel(const s
 {
     if (HostLinux::Active())
         return nullptr;
-    return Runtime::Run("HlFileSystemImpl.GetHLFSFileSystemByLabel", nullptr, [&]() -> std::unique_ptr<HlFileSystem> {
-        Runtime::CheckedState();
-        Runtime::CheckFault("HlFileSystemImpl.GetHLFSFileSystemByLabel", {label});
-        const FileSystemRecord* r = Runtime::FirstByVolumeName(label);
-        return r && r->kind == FsKind::Hlfs ? HostSim::Objects::MakeHlfs(*r) : nullptr;
-    });
+    return FindHlfs("HlFileSystemImpl.GetHLFSFileSystemByLabel", label, Runtime::FirstByVolumeName);
 }
 
 std::unique_ptr<HlFileSystem> HlFileSystemImpl::GetHLFSFileSystemByUUID(const std::string& uuid)
 {
     if (HostLinux::Active())
         return nullptr;
-    return Runtime::Run("HlFileSystemImpl.GetHLFSFileSystemByUUID", nullptr, [&]() -> std::unique_ptr<HlFileSystem> {
-        Runtime::CheckedState();
-        Runtime::CheckFault("HlFileSystemImpl.GetHLFSFileSystemByUUID", {uuid});
-        const FileSystemRecord* r = Runtime::FirstByUuid(uuid);
-        return r && r->kind == FsKind::Hlfs ? HostSim::Objects::MakeHlfs(*r) : nullptr;
-    });
+    return FindHlfs("HlFileSystemImpl.GetHLFSFileSystemByUUID", uuid, Runtime::FirstByUuid);
 }
 
 void HlFileSystemImpl::ConvertToVersion5()
@@ -568,7 +512,7 @@ void HlFileSystemImpl::ConvertToVersion5()
     OnFileSystem(*handle_, "HlFileSystemImpl.ConvertToVersion5", &args, [](FileSystemRecord& r) {
         if (r.Hlfs().majorVersion != 3)
             Runtime::Throw("Volume '" + r.volumeName + "' is not an HLFS-3 volume");
-        SetKey(r, r.MutableHlfs().majorVersion, 5, FsKey::majorVersion);
+        Change(r, r.MutableHlfs().majorVersion, 5, FsKey::majorVersion);
     });
 }
 
@@ -580,8 +524,7 @@ void HlFileSystemImpl::UnmapVolume(unsigned reclaimUnit, void* context)
 
 bool HlFileSystemImpl::IsAccessible()
 {
-    return OnFileSystem(*handle_, "HlFileSystemImpl.IsAccessible", nullptr,
-                        [](FileSystemRecord& r) { return r.accessible; });
+    return ReadField<&FileSystemRecord::accessible>(*handle_, "HlFileSystemImpl.IsAccessible");
 }
 
 void HlFileSystemImpl::Mount(MountOperationOption option) { Ops::Mount(*handle_, option); }
@@ -623,8 +566,7 @@ std::vector<std::unique_ptr<HostCtl::Storage::DiskLunPartition>> HlFileSystemImp
 
 std::string HlFileSystemImpl::GetLvmUuid()
 {
-    return OnFileSystem(*handle_, "HlFileSystem.GetLvmUuid", nullptr,
-                        [](FileSystemRecord& r) { return r.Hlfs().lvmUuid; });
+    return ReadField<&Model::HlfsFields::lvmUuid>(*handle_, "HlFileSystem.GetLvmUuid");
 }
 
 unsigned HlFileSystemImpl::GetLockMode()
@@ -635,9 +577,7 @@ unsigned HlFileSystemImpl::GetLockMode()
 
 void HlFileSystemImpl::SetLockMode(unsigned mode)
 {
-    const J args = J::array({mode});
-    OnFileSystem(*handle_, "HlFileSystem.SetLockMode", &args,
-                 [&](FileSystemRecord& r) { SetKey(r, r.MutableHlfs().lockMode, mode, FsKey::lockMode); });
+    WriteField<&Model::HlfsFields::lockMode>(*handle_, "HlFileSystem.SetLockMode", FsKey::lockMode, mode);
 }
 
 int HlFileSystemImpl::GetATSSupport()
@@ -707,16 +647,13 @@ void HlFileSystemImpl::SetUnmapProperty(const HostCtl::Storage::HlfsVolumeUnmapP
 
 bool HlFileSystemImpl::IsClusteredHdskEnabled()
 {
-    return OnFileSystem(*handle_, "HlFileSystem.IsClusteredHdskEnabled", nullptr,
-                        [](FileSystemRecord& r) { return r.Hlfs().clusteredHdskEnabled; });
+    return ReadField<&Model::HlfsFields::clusteredHdskEnabled>(*handle_, "HlFileSystem.IsClusteredHdskEnabled");
 }
 
 void HlFileSystemImpl::SetClusteredHdskEnabled(bool enabled)
 {
-    const J args = J::array({enabled});
-    OnFileSystem(*handle_, "HlFileSystem.SetClusteredHdskEnabled", &args, [&](FileSystemRecord& r) {
-        SetKey(r, r.MutableHlfs().clusteredHdskEnabled, enabled, FsKey::clusteredHdskEnabled);
-    });
+    WriteField<&Model::HlfsFields::clusteredHdskEnabled>(*handle_, "HlFileSystem.SetClusteredHdskEnabled",
+                                                         FsKey::clusteredHdskEnabled, enabled);
 }
 
 // ---- unresolved copies --------------------------------------------------------------------
@@ -731,14 +668,12 @@ UnresolvedHlfsExtentImpl::~UnresolvedHlfsExtentImpl() = default;
 
 std::string UnresolvedHlfsExtentImpl::GetDeviceName()
 {
-    return HostSim::Objects::OnUnresolvedExtent(*handle_, "DiskLunPartition.GetDeviceName",
-                                                [](const HostSim::Model::UnresolvedExtent& e) { return e.deviceName; });
+    return HostSim::Objects::ExtentDeviceName(*handle_, HostSim::Objects::ExtentSource::Unresolved);
 }
 
 std::uint8_t UnresolvedHlfsExtentImpl::GetPartition()
 {
-    return HostSim::Objects::OnUnresolvedExtent(*handle_, "DiskLunPartition.GetPartition",
-                                                [](const HostSim::Model::UnresolvedExtent& e) { return e.partition; });
+    return HostSim::Objects::ExtentPartition(*handle_, HostSim::Objects::ExtentSource::Unresolved);
 }
 
 std::int64_t UnresolvedHlfsExtentImpl::GetStart()
@@ -761,20 +696,18 @@ UnresolvedHlfsVolumeImpl::~UnresolvedHlfsVolumeImpl() = default;
 
 std::string UnresolvedHlfsVolumeImpl::GetLvmUuid()
 {
-    return HostSim::Objects::OnUnresolved(*handle_, "UnresolvedHlfsVolumeImpl.GetLvmUuid", nullptr,
-                                          [](UnresolvedVolume& u) { return u.lvmUuid; });
+    return HostSim::Objects::ReadField<&UnresolvedVolume::lvmUuid>(*handle_, "UnresolvedHlfsVolumeImpl.GetLvmUuid");
 }
 
 std::string UnresolvedHlfsVolumeImpl::GetUuid()
 {
-    return HostSim::Objects::OnUnresolved(*handle_, "UnresolvedHlfsVolumeImpl.GetUuid", nullptr,
-                                          [](UnresolvedVolume& u) { return u.uuid; });
+    return HostSim::Objects::ReadField<&UnresolvedVolume::uuid>(*handle_, "UnresolvedHlfsVolumeImpl.GetUuid");
 }
 
 std::string UnresolvedHlfsVolumeImpl::GetVolumeName()
 {
-    return HostSim::Objects::OnUnresolved(*handle_, "UnresolvedHlfsVolumeImpl.GetVolumeName", nullptr,
-                                          [](UnresolvedVolume& u) { return u.volumeName; });
+    return HostSim::Objects::ReadField<&UnresolvedVolume::volumeName>(*handle_,
+                                                                      "UnresolvedHlfsVolumeImpl.GetVolumeName");
 }
 
 std::vector<std::unique_ptr<HostCtl::Storage::UnresolvedHlfsExtent>> UnresolvedHlfsVolumeImpl::GetExtents()

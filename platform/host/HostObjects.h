@@ -6,6 +6,8 @@
 #include <cstdint>
 #include <memory>
 #include <string>
+#include <type_traits>
+#include <utility>
 
 #include "HostRuntime.h"
 #include "hostctl/Host.h"
@@ -50,17 +52,59 @@ std::unique_ptr<HostCtl::Storage::UnresolvedHlfsVolume> MakeUnresolved(const Unr
 FileSystemRecord& Resolve(const Handle& handle);
 UnresolvedVolume& ResolveUnresolved(const Handle& handle);
 
-// Runs `body(record)` as call `call` on a file system object: state check, fault check with
-// the volume's name and UUID as targets, journal (when `args` is given), persistence.
-template <typename F>
-auto OnFileSystem(const Handle& handle, std::string_view call, const nlohmann::ordered_json* args, F&& body)
+// Runs `body(record)` as call `call` on the record behind an object's handle (a file
+// system's or an unresolved volume's): state check, fault check with the volume's name and
+// UUID as targets, journal (when `args` is given), persistence.
+template <typename Record, typename F>
+auto OnRecord(const Handle& handle, std::string_view call, const nlohmann::ordered_json* args, F&& body)
 {
     Runtime::JournalEntry entry{handle.name, args ? *args : nlohmann::ordered_json()};
     return Runtime::Run(call, args ? &entry : nullptr, [&] {
-        FileSystemRecord& record = Resolve(handle);
-        Runtime::CheckFault(call, {record.volumeName, record.uuid});
-        return body(record);
+        Record* record;
+        if constexpr (std::is_same_v<Record, UnresolvedVolume>)
+            record = &ResolveUnresolved(handle);
+        else
+            record = &Resolve(handle);
+        Runtime::CheckFault(call, {record->volumeName, record->uuid});
+        return body(*record);
     });
+}
+
+template <typename F>
+auto OnFileSystem(const Handle& handle, std::string_view call, const nlohmann::ordered_json* args, F&& body)
+{
+    return OnRecord<FileSystemRecord>(handle, call, args, std::forward<F>(body));
+}
+
+// Reads field `Member` of the record behind an object's handle as call `call`.
+template <auto Member>
+auto ReadField(const Handle& h, std::string_view call)
+{
+    if constexpr (std::is_same_v<typename Model::MemberOf<decltype(Member)>::Part, UnresolvedVolume>)
+        return OnRecord<UnresolvedVolume>(h, call, nullptr, [](UnresolvedVolume& u) { return u.*Member; });
+    else
+        return OnFileSystem(h, call, nullptr,
+                            [](FileSystemRecord& r) { return Model::Field<Member>(std::as_const(r)); });
+}
+
+// Changes one key of a file system; only a real change marks the state for saving.
+template <typename T, typename V>
+void Change(FileSystemRecord& record, T& field, const V& value, Model::FsKey key)
+{
+    if (field == value)
+        return;
+    Runtime::MarkDirty();
+    field = value;
+    record.Mark(key);
+}
+
+// Sets field `Member` (present in the record as `key`) to `value` as call `call`, with the
+// value as the call's one argument.
+template <auto Member, typename V>
+void WriteField(const Handle& h, std::string_view call, Model::FsKey key, const V& value)
+{
+    const auto args = nlohmann::ordered_json::array({value});
+    OnFileSystem(h, call, &args, [&](FileSystemRecord& r) { Change(r, Model::Field<Member>(r), value, key); });
 }
 
 // The FileSystem operations, shared by every kind of file system object.
@@ -142,33 +186,34 @@ public:
     bool IsHidden();
 };
 
-// One extent (a partition of a disk LUN) of an HLFS volume.
-class LunPartitionObject final : public DiskLunPartition {
+// Where an extent object's record lives: in an HLFS volume's extents or an unresolved volume's.
+enum class ExtentSource { Volume, Unresolved };
+
+// The DiskLunPartition calls on the extent record behind a handle.
+std::string ExtentDeviceName(const Handle& handle, ExtentSource source);
+std::uint8_t ExtentPartition(const Handle& handle, ExtentSource source);
+
+// One extent seen through its handle: a partition of a disk LUN of an HLFS volume, or an
+// extent of an unresolved volume marked `impl: false` (not the host's implementation class).
+template <typename Interface, ExtentSource Source>
+class ExtentObject final : public Interface {
 public:
-    explicit LunPartitionObject(HandlePtr handle) : handle_(std::move(handle)) {}
-    ~LunPartitionObject() override;
-    std::string GetDeviceName() override;
-    std::uint8_t GetPartition() override;
+    explicit ExtentObject(HandlePtr handle) : handle_(std::move(handle)) {}
+    ~ExtentObject() override = default;
+    std::string GetDeviceName() override { return ExtentDeviceName(*handle_, Source); }
+    std::uint8_t GetPartition() override { return ExtentPartition(*handle_, Source); }
 
 private:
     HandlePtr handle_;
 };
 
-// Unresolved volumes and extents marked `impl: false`: not the host's implementation classes.
+using LunPartitionObject = ExtentObject<DiskLunPartition, ExtentSource::Volume>;
+using ForeignUnresolvedExtent = ExtentObject<HostCtl::Storage::UnresolvedHlfsExtent, ExtentSource::Unresolved>;
+
+// Unresolved volumes marked `impl: false`: not the host's implementation class.
 class ForeignUnresolvedVolume final : public HostCtl::Storage::UnresolvedHlfsVolume {
 public:
     ~ForeignUnresolvedVolume() override;
-};
-
-class ForeignUnresolvedExtent final : public HostCtl::Storage::UnresolvedHlfsExtent {
-public:
-    explicit ForeignUnresolvedExtent(HandlePtr handle) : handle_(std::move(handle)) {}
-    ~ForeignUnresolvedExtent() override;
-    std::string GetDeviceName() override;
-    std::uint8_t GetPartition() override;
-
-private:
-    HandlePtr handle_;
 };
 
 // The extent record behind an unresolved-extent handle; throws when it has gone.

@@ -162,6 +162,127 @@ std::string CanonicalMac(const json& v, const Where& w)
     return out;
 }
 
+std::uint64_t U64(const json& v, const Where& w) { return Unsigned(v, w); }
+
+std::int64_t I64(const json& v, const Where& w)
+{
+    return Signed(v, w, std::numeric_limits<std::int64_t>::min(), std::numeric_limits<std::int64_t>::max());
+}
+
+// ---- records ------------------------------------------------------------------------------
+
+template <typename T>
+ojson ToJson(const T& value)
+{
+    return value;
+}
+
+template <typename T>
+ojson ToJson(const std::optional<T>& value)
+{
+    return value ? ojson(*value) : ojson(nullptr);
+}
+
+// One key of a record in the state: how it is read into the record and written out of it.
+template <typename T>
+struct Key {
+    const char* name;
+    void (*read)(T&, const json&, const Where&);
+    ojson (*write)(const T&);
+};
+
+// The key that holds member `Member` of a `T`, read by `Read`, which checks the value.
+template <auto Member, auto Read, typename T = typename MemberOf<decltype(Member)>::Part>
+constexpr Key<T> KeyOf(const char* name)
+{
+    return {name, [](T& r, const json& v, const Where& w) { r.*Member = Read(v, w); },
+            [](const T& r) { return ToJson(r.*Member); }};
+}
+
+// Reads the object at `w` into `r`; a key `keys` does not list is an error.
+template <typename T, std::size_t N>
+void ReadKeys(T& r, const json& v, const Where& w, const Key<T> (&keys)[N])
+{
+    EachKey(v, w, [&](const std::string& name, const json& value, const Where& at) {
+        for (const auto& key : keys) {
+            if (name == key.name) {
+                key.read(r, value, at);
+                return;
+            }
+        }
+        UnknownKey(at);
+    });
+}
+
+// Appends the records of the array at `w` to `out`.
+template <typename T, std::size_t N>
+void ReadRecords(std::vector<T>& out, const json& v, const Where& w, const Key<T> (&keys)[N])
+{
+    long i = 0;
+    for (const auto& item : Array(v, w)) {
+        T r;
+        ReadKeys(r, item, w[i++], keys);
+        out.push_back(std::move(r));
+    }
+}
+
+// Every key of `r`, in the order `keys` lists them.
+template <typename T, std::size_t N>
+ojson WriteKeys(const T& r, const Key<T> (&keys)[N])
+{
+    ojson out = ojson::object();
+    for (const auto& key : keys)
+        out[key.name] = key.write(r);
+    return out;
+}
+
+template <typename T, typename F>
+ojson ListOf(const std::vector<T>& items, F&& convert)
+{
+    ojson list = ojson::array();
+    for (const auto& item : items)
+        list.push_back(convert(item));
+    return list;
+}
+
+const Key<Extent> kExtentKeys[] = {KeyOf<&Extent::deviceName, Str>("deviceName"),
+                                   KeyOf<&Extent::partition, Uint8>("partition")};
+
+const Key<UnresolvedExtent> kUnresolvedExtentKeys[] = {
+    KeyOf<&Extent::deviceName, Str, UnresolvedExtent>("deviceName"),
+    KeyOf<&Extent::partition, Uint8, UnresolvedExtent>("partition"), KeyOf<&UnresolvedExtent::start, I64>("start"),
+    KeyOf<&UnresolvedExtent::end, I64>("end"), KeyOf<&UnresolvedExtent::impl, Bool>("impl")};
+
+const Key<User> kUserKeys[] = {KeyOf<&User::heartbeatUuid, Str>("heartbeatUuid"),
+                               KeyOf<&User::macAddress, CanonicalMac>("macAddress"),
+                               KeyOf<&User::driverVersionMajor, Uint32>("driverVersionMajor"),
+                               KeyOf<&User::driverVersionMinor, Uint32>("driverVersionMinor"),
+                               KeyOf<&User::heartbeatOffset, I64>("heartbeatOffset"),
+                               KeyOf<&User::lockModeInUse, Uint8>("lockModeInUse"),
+                               KeyOf<&User::live, Bool>("live")};
+
+const Key<UnmapProperty> kUnmapKeys[] = {
+    KeyOf<&UnmapProperty::granularity, Uint32>("granularity"), KeyOf<&UnmapProperty::priority, Str>("priority"),
+    KeyOf<&UnmapProperty::bandwidth, Int32>("bandwidth"), KeyOf<&UnmapProperty::reserved, Int32>("reserved"),
+    KeyOf<&UnmapProperty::method, Str>("method")};
+
+const Key<NfsExport> kNfsExportKeys[] = {KeyOf<&NfsExport::host, Str>("host"), KeyOf<&NfsExport::share, Str>("share"),
+                                         KeyOf<&NfsExport::capacity, U64>("capacity"),
+                                         KeyOf<&NfsExport::used, U64>("used")};
+
+const Key<Heap> kHeapKeys[] = {KeyOf<&Heap::name, Str>("name"), KeyOf<&Heap::size, U64>("size"),
+                               KeyOf<&Heap::maxSize, U64>("maxSize")};
+
+using Cache = PointerBlockCacheRecord;
+const Key<Cache> kCacheKeys[] = {
+    KeyOf<&Cache::cacheSize, U64>("cacheSize"),       KeyOf<&Cache::cacheSizeMax, U64>("cacheSizeMax"),
+    KeyOf<&Cache::workingSet, U64>("workingSet"),     KeyOf<&Cache::workingSetMax, U64>("workingSetMax"),
+    KeyOf<&Cache::heapOverhead, U64>("heapOverhead"), KeyOf<&Cache::capacityMissRatio, Int32>("capacityMissRatio")};
+
+const Key<Fault> kFaultKeys[] = {KeyOf<&Fault::call, Str>("call"), KeyOf<&Fault::target, Str>("target"),
+                                 KeyOf<&Fault::message, Str>("message"), KeyOf<&Fault::skip, U64>("skip"),
+                                 KeyOf<&Fault::times, U64>("times")};
+
 // ---- file systems -------------------------------------------------------------------------
 
 using Record = FileSystemRecord;
@@ -180,48 +301,36 @@ ojson WriteExtents(const std::vector<Extent>& extents)
         if (e.null)
             list.push_back(nullptr);
         else
-            list.push_back({{"deviceName", e.deviceName}, {"partition", e.partition}});
+            list.push_back(WriteKeys(e, kExtentKeys));
     }
     return list;
 }
 
+// The key that holds field `Member` of a volume's record, read by `Read`, which checks the value.
+template <auto Member, auto Read>
+constexpr FsField FsKeyOf(const char* key, FsKey bit)
+{
+    return {key, bit, [](Record& r, const json& v, const Where& w) { Field<Member>(r) = Read(v, w); },
+            [](const Record& r) { return ToJson(Field<Member>(r)); }};
+}
+
 const FsField kFsFields[] = {
-    {"type", FsKey::type, [](Record& r, const json& v, const Where& w) { r.type = Str(v, w); },
-     [](const Record& r) -> ojson { return r.type; }},
-    {"volumeName", FsKey::volumeName, [](Record& r, const json& v, const Where& w) { r.volumeName = Str(v, w); },
-     [](const Record& r) -> ojson { return r.volumeName; }},
-    {"name", FsKey::name, [](Record& r, const json& v, const Where& w) { r.name = Str(v, w); },
-     [](const Record& r) -> ojson { return r.name; }},
-    {"uuid", FsKey::uuid, [](Record& r, const json& v, const Where& w) { r.uuid = Str(v, w); },
-     [](const Record& r) -> ojson { return r.uuid; }},
-    {"mountPoint", FsKey::mountPoint, [](Record& r, const json& v, const Where& w) { r.mountPoint = Str(v, w); },
-     [](const Record& r) -> ojson { return r.mountPoint; }},
-    {"mounted", FsKey::mounted, [](Record& r, const json& v, const Where& w) { r.mounted = Bool(v, w); },
-     [](const Record& r) -> ojson { return r.mounted; }},
-    {"accessible", FsKey::accessible, [](Record& r, const json& v, const Where& w) { r.accessible = Bool(v, w); },
-     [](const Record& r) -> ojson { return r.accessible; }},
-    {"capacity", FsKey::capacity, [](Record& r, const json& v, const Where& w) { r.capacity = Unsigned(v, w); },
-     [](const Record& r) -> ojson { return r.capacity; }},
-    {"used", FsKey::used, [](Record& r, const json& v, const Where& w) { r.used = Unsigned(v, w); },
-     [](const Record& r) -> ojson { return r.used; }},
-    {"qaxiState", FsKey::qaxiState, [](Record& r, const json& v, const Where& w) { r.qaxiState = Int32(v, w); },
-     [](const Record& r) -> ojson { return r.qaxiState; }},
-    {"busy", FsKey::busy, [](Record& r, const json& v, const Where& w) { r.busy = Bool(v, w); },
-     [](const Record& r) -> ojson { return r.busy; }},
-    {"explicitlyUnmounted", FsKey::explicitlyUnmounted,
-     [](Record& r, const json& v, const Where& w) { r.explicitlyUnmounted = Bool(v, w); },
-     [](const Record& r) -> ojson { return r.explicitlyUnmounted; }},
-    {"majorVersion", FsKey::majorVersion,
-     [](Record& r, const json& v, const Where& w) { r.MutableHlfs().majorVersion = Int32(v, w); },
-     [](const Record& r) -> ojson { return r.Hlfs().majorVersion; }},
-    {"lvmUuid", FsKey::lvmUuid, [](Record& r, const json& v, const Where& w) { r.MutableHlfs().lvmUuid = Str(v, w); },
-     [](const Record& r) -> ojson { return r.Hlfs().lvmUuid; }},
-    {"lockMode", FsKey::lockMode,
-     [](Record& r, const json& v, const Where& w) { r.MutableHlfs().lockMode = Uint32(v, w); },
-     [](const Record& r) -> ojson { return r.Hlfs().lockMode; }},
-    {"atsSupport", FsKey::atsSupport,
-     [](Record& r, const json& v, const Where& w) { r.MutableHlfs().atsSupport = Int32(v, w); },
-     [](const Record& r) -> ojson { return r.Hlfs().atsSupport; }},
+    FsKeyOf<&Record::type, Str>("type", FsKey::type),
+    FsKeyOf<&Record::volumeName, Str>("volumeName", FsKey::volumeName),
+    FsKeyOf<&Record::name, Str>("name", FsKey::name),
+    FsKeyOf<&Record::uuid, Str>("uuid", FsKey::uuid),
+    FsKeyOf<&Record::mountPoint, Str>("mountPoint", FsKey::mountPoint),
+    FsKeyOf<&Record::mounted, Bool>("mounted", FsKey::mounted),
+    FsKeyOf<&Record::accessible, Bool>("accessible", FsKey::accessible),
+    FsKeyOf<&Record::capacity, U64>("capacity", FsKey::capacity),
+    FsKeyOf<&Record::used, U64>("used", FsKey::used),
+    FsKeyOf<&Record::qaxiState, Int32>("qaxiState", FsKey::qaxiState),
+    FsKeyOf<&Record::busy, Bool>("busy", FsKey::busy),
+    FsKeyOf<&Record::explicitlyUnmounted, Bool>("explicitlyUnmounted", FsKey::explicitlyUnmounted),
+    FsKeyOf<&HlfsFields::majorVersion, Int32>("majorVersion", FsKey::majorVersion),
+    FsKeyOf<&HlfsFields::lvmUuid, Str>("lvmUuid", FsKey::lvmUuid),
+    FsKeyOf<&HlfsFields::lockMode, Uint32>("lockMode", FsKey::lockMode),
+    FsKeyOf<&HlfsFields::atsSupport, Int32>("atsSupport", FsKey::atsSupport),
     {"extents", FsKey::extents,
      [](Record& r, const json& v, const Where& w) {
          auto& extents = r.MutableHlfs().extents;
@@ -234,134 +343,36 @@ const FsField kFsFields[] = {
                  ++i;
                  continue;
              }
-             EachKey(item, w[i++], [&](const std::string& key, const json& value, const Where& at) {
-                 if (key == "deviceName")
-                     e.deviceName = Str(value, at);
-                 else if (key == "partition")
-                     e.partition = Uint8(value, at);
-                 else
-                     UnknownKey(at);
-             });
+             ReadKeys(e, item, w[i++], kExtentKeys);
              extents.push_back(std::move(e));
          }
      },
      [](const Record& r) -> ojson { return WriteExtents(r.Hlfs().extents); }},
     {"users", FsKey::users,
-     [](Record& r, const json& v, const Where& w) {
-         auto& users = r.MutableHlfs().users;
-         long i = 0;
-         for (const auto& item : Array(v, w)) {
-             User u;
-             EachKey(item, w[i++], [&](const std::string& key, const json& value, const Where& at) {
-                 if (key == "heartbeatUuid")
-                     u.heartbeatUuid = Str(value, at);
-                 else if (key == "macAddress")
-                     u.macAddress = CanonicalMac(value, at);
-                 else if (key == "driverVersionMajor")
-                     u.driverVersionMajor = Uint32(value, at);
-                 else if (key == "driverVersionMinor")
-                     u.driverVersionMinor = Uint32(value, at);
-                 else if (key == "heartbeatOffset")
-                     u.heartbeatOffset = Signed(value, at, std::numeric_limits<std::int64_t>::min(),
-                                                std::numeric_limits<std::int64_t>::max());
-                 else if (key == "lockModeInUse")
-                     u.lockModeInUse = Uint8(value, at);
-                 else if (key == "live")
-                     u.live = Bool(value, at);
-                 else
-                     UnknownKey(at);
-             });
-             users.push_back(std::move(u));
-         }
-     },
+     [](Record& r, const json& v, const Where& w) { ReadRecords(r.MutableHlfs().users, v, w, kUserKeys); },
      [](const Record& r) -> ojson {
-         ojson list = ojson::array();
-         for (const auto& u : r.Hlfs().users)
-             list.push_back({{"heartbeatUuid", u.heartbeatUuid},
-                             {"macAddress", u.macAddress},
-                             {"driverVersionMajor", u.driverVersionMajor},
-                             {"driverVersionMinor", u.driverVersionMinor},
-                             {"heartbeatOffset", u.heartbeatOffset},
-                             {"lockModeInUse", u.lockModeInUse},
-                             {"live", u.live}});
-         return list;
+         return ListOf(r.Hlfs().users, [](const User& u) { return WriteKeys(u, kUserKeys); });
      }},
     {"unmapProperty", FsKey::unmapProperty,
-     [](Record& r, const json& v, const Where& w) {
-         auto& p = r.MutableHlfs().unmapProperty;
-         EachKey(v, w, [&](const std::string& key, const json& value, const Where& at) {
-             if (key == "granularity")
-                 p.granularity = Uint32(value, at);
-             else if (key == "priority")
-                 p.priority = Str(value, at);
-             else if (key == "bandwidth")
-                 p.bandwidth = Int32(value, at);
-             else if (key == "reserved")
-                 p.reserved = Int32(value, at);
-             else if (key == "method")
-                 p.method = Str(value, at);
-             else
-                 UnknownKey(at);
-         });
-     },
-     [](const Record& r) -> ojson {
-         const auto& p = r.Hlfs().unmapProperty;
-         return {{"granularity", p.granularity},
-                 {"priority", p.priority},
-                 {"bandwidth", p.bandwidth},
-                 {"reserved", p.reserved},
-                 {"method", p.method}};
-     }},
-    {"clusteredHdskEnabled", FsKey::clusteredHdskEnabled,
-     [](Record& r, const json& v, const Where& w) { r.MutableHlfs().clusteredHdskEnabled = Bool(v, w); },
-     [](const Record& r) -> ojson { return r.Hlfs().clusteredHdskEnabled; }},
-    {"remoteHost", FsKey::remoteHost,
-     [](Record& r, const json& v, const Where& w) { r.MutableNfs().remoteHost = Str(v, w); },
-     [](const Record& r) -> ojson { return r.Nfs().remoteHost; }},
-    {"remoteHosts", FsKey::remoteHosts,
-     [](Record& r, const json& v, const Where& w) { r.MutableNfs().remoteHosts = Strings(v, w); },
-     [](const Record& r) -> ojson { return r.Nfs().remoteHosts; }},
-    {"remoteShare", FsKey::remoteShare,
-     [](Record& r, const json& v, const Where& w) { r.MutableNfs().remoteShare = Str(v, w); },
-     [](const Record& r) -> ojson { return r.Nfs().remoteShare; }},
-    {"readOnly", FsKey::readOnly,
-     [](Record& r, const json& v, const Where& w) { r.MutableNfs().readOnly = Bool(v, w); },
-     [](const Record& r) -> ojson { return r.Nfs().readOnly; }},
-    {"readOnlyState", FsKey::readOnlyState,
-     [](Record& r, const json& v, const Where& w) { r.MutableNfs().readOnlyState = Bool(v, w); },
-     [](const Record& r) -> ojson { return r.Nfs().readOnlyState; }},
-    {"isPE", FsKey::isPE, [](Record& r, const json& v, const Where& w) { r.MutableNfs().isPE = Bool(v, w); },
-     [](const Record& r) -> ojson { return r.Nfs().isPE; }},
-    {"hidden", FsKey::hidden, [](Record& r, const json& v, const Where& w) { r.MutableNfs().hidden = Bool(v, w); },
-     [](const Record& r) -> ojson { return r.Nfs().hidden; }},
-    {"knxnic", FsKey::knxnic, [](Record& r, const json& v, const Where& w) { r.MutableNfs().knxnic = Str(v, w); },
-     [](const Record& r) -> ojson { return r.Nfs().knxnic; }},
-    {"knxnics", FsKey::knxnics, [](Record& r, const json& v, const Where& w) { r.MutableNfs().knxnics = Str(v, w); },
-     [](const Record& r) -> ojson { return r.Nfs().knxnics; }},
-    {"connections", FsKey::connections,
-     [](Record& r, const json& v, const Where& w) {
-         r.MutableNfs().connections =
-             Signed(v, w, std::numeric_limits<std::int64_t>::min(), std::numeric_limits<std::int64_t>::max());
-     },
-     [](const Record& r) -> ojson { return r.Nfs().connections; }},
-    {"connectionsParam", FsKey::connectionsParam,
-     [](Record& r, const json& v, const Where& w) { r.MutableNfs().connectionsParam = Int32(v, w); },
-     [](const Record& r) -> ojson { return r.Nfs().connectionsParam; }},
-    {"maxQueueDepth", FsKey::maxQueueDepth,
-     [](Record& r, const json& v, const Where& w) { r.MutableNfs().maxQueueDepth = Uint32(v, w); },
-     [](const Record& r) -> ojson { return r.Nfs().maxQueueDepth; }},
-    {"maxReadTransferSize", FsKey::maxReadTransferSize,
-     [](Record& r, const json& v, const Where& w) { r.MutableNfs().maxReadTransferSize = Uint32(v, w); },
-     [](const Record& r) -> ojson { return r.Nfs().maxReadTransferSize; }},
-    {"maxWriteTransferSize", FsKey::maxWriteTransferSize,
-     [](Record& r, const json& v, const Where& w) { r.MutableNfs().maxWriteTransferSize = Uint32(v, w); },
-     [](const Record& r) -> ojson { return r.Nfs().maxWriteTransferSize; }},
-    {"securityType", FsKey::securityType,
-     [](Record& r, const json& v, const Where& w) { r.MutableNfs().securityType = Int32(v, w); },
-     [](const Record& r) -> ojson { return r.Nfs().securityType; }},
-    {"preUnmount", FsKey::preUnmount, [](Record& r, const json& v, const Where& w) { r.preUnmount = Bool(v, w); },
-     [](const Record& r) -> ojson { return r.preUnmount; }},
-};
+     [](Record& r, const json& v, const Where& w) { ReadKeys(r.MutableHlfs().unmapProperty, v, w, kUnmapKeys); },
+     [](const Record& r) -> ojson { return WriteKeys(r.Hlfs().unmapProperty, kUnmapKeys); }},
+    FsKeyOf<&HlfsFields::clusteredHdskEnabled, Bool>("clusteredHdskEnabled", FsKey::clusteredHdskEnabled),
+    FsKeyOf<&NfsFields::remoteHost, Str>("remoteHost", FsKey::remoteHost),
+    FsKeyOf<&NfsFields::remoteHosts, Strings>("remoteHosts", FsKey::remoteHosts),
+    FsKeyOf<&NfsFields::remoteShare, Str>("remoteShare", FsKey::remoteShare),
+    FsKeyOf<&NfsFields::readOnly, Bool>("readOnly", FsKey::readOnly),
+    FsKeyOf<&NfsFields::readOnlyState, Bool>("readOnlyState", FsKey::readOnlyState),
+    FsKeyOf<&NfsFields::isPE, Bool>("isPE", FsKey::isPE),
+    FsKeyOf<&NfsFields::hidden, Bool>("hidden", FsKey::hidden),
+    FsKeyOf<&NfsFields::knxnic, Str>("knxnic", FsKey::knxnic),
+    FsKeyOf<&NfsFields::knxnics, Str>("knxnics", FsKey::knxnics),
+    FsKeyOf<&NfsFields::connections, I64>("connections", FsKey::connections),
+    FsKeyOf<&NfsFields::connectionsParam, Int32>("connectionsParam", FsKey::connectionsParam),
+    FsKeyOf<&NfsFields::maxQueueDepth, Uint32>("maxQueueDepth", FsKey::maxQueueDepth),
+    FsKeyOf<&NfsFields::maxReadTransferSize, Uint32>("maxReadTransferSize", FsKey::maxReadTransferSize),
+    FsKeyOf<&NfsFields::maxWriteTransferSize, Uint32>("maxWriteTransferSize", FsKey::maxWriteTransferSize),
+    FsKeyOf<&NfsFields::securityType, Int32>("securityType", FsKey::securityType),
+    FsKeyOf<&Record::preUnmount, Bool>("preUnmount", FsKey::preUnmount)};
 
 static_assert(std::size(kFsFields) == static_cast<std::size_t>(FsKey::count));
 
@@ -444,22 +455,7 @@ UnresolvedVolume ReadUnresolved(const json& v, const Where& w)
                 } else {
                     if (!item.is_object())
                         WrongType(itemAt, "an object or null", item);
-                    EachKey(item, itemAt, [&](const std::string& k, const json& x, const Where& xAt) {
-                        if (k == "deviceName")
-                            e.deviceName = Str(x, xAt);
-                        else if (k == "partition")
-                            e.partition = Uint8(x, xAt);
-                        else if (k == "start")
-                            e.start = Signed(x, xAt, std::numeric_limits<std::int64_t>::min(),
-                                             std::numeric_limits<std::int64_t>::max());
-                        else if (k == "end")
-                            e.end = Signed(x, xAt, std::numeric_limits<std::int64_t>::min(),
-                                           std::numeric_limits<std::int64_t>::max());
-                        else if (k == "impl")
-                            e.impl = Bool(x, xAt);
-                        else
-                            UnknownKey(xAt);
-                    });
+                    ReadKeys(e, item, itemAt, kUnresolvedExtentKeys);
                 }
                 u.extents.push_back(std::move(e));
             }
@@ -499,9 +495,9 @@ ojson WriteUnresolved(const UnresolvedVolume& u)
             extents.push_back(nullptr);
             continue;
         }
-        ojson x = {{"deviceName", e.deviceName}, {"partition", e.partition}, {"start", e.start}, {"end", e.end}};
-        if (!e.impl)
-            x["impl"] = false;
+        ojson x = WriteKeys(e, kUnresolvedExtentKeys);
+        if (e.impl)
+            x.erase("impl");
         extents.push_back(std::move(x));
     }
     out["extents"] = std::move(extents);
@@ -540,150 +536,97 @@ void ReadAdvancedOptions(State& st, const json& v, const Where& w)
     });
 }
 
+// Appends the elements of the array at `w`, each read by `read`, to `out`.
+template <typename T>
+void ReadList(std::vector<T>& out, const json& v, const Where& w, T (*read)(const json&, const Where&))
+{
+    long i = 0;
+    for (const auto& item : Array(v, w))
+        out.push_back(read(item, w[i++]));
+}
+
+// As ReadList, and gives each new element the session's next id.
+template <typename T>
+void ReadListWithIds(std::vector<T>& out, std::uint64_t& nextId, const json& v, const Where& w,
+                     T (*read)(const json&, const Where&))
+{
+    const std::size_t first = out.size();
+    ReadList(out, v, w, read);
+    for (std::size_t i = first; i < out.size(); ++i)
+        out[i].id = nextId++;
+}
+
 void ReadPendingRescan(State& st, const json& v, const Where& w)
 {
     EachKey(v, w, [&](const std::string& key, const json& value, const Where& at) {
-        long i = 0;
         if (key == "fileSystems") {
             st.pendingHasFileSystems = true;
-            for (const auto& item : Array(value, at))
-                st.pendingFileSystems.push_back(ReadFileSystem(item, at[i++]));
+            ReadList(st.pendingFileSystems, value, at, ReadFileSystem);
         } else if (key == "unresolvedVolumes") {
             st.pendingHasUnresolved = true;
-            for (const auto& item : Array(value, at))
-                st.pendingUnresolved.push_back(ReadUnresolved(item, at[i++]));
+            ReadList(st.pendingUnresolved, value, at, ReadUnresolved);
         } else {
             UnknownKey(at);
         }
     });
 }
 
+Fault ReadFault(const json& v, const Where& w)
+{
+    Fault f;
+    ReadKeys(f, v, w, kFaultKeys);
+    if (!v.contains("call"))
+        Fail(w, "missing required key 'call'");
+    if (!v.contains("message"))
+        f.message = "Injected failure of " + f.call;
+    return f;
+}
+
+const Key<State> kBehaviourKeys[] = {KeyOf<&State::tryMount, Bool>("tryMount")};
+const Key<State> kFirewallKeys[] = {KeyOf<&State::nfsClient, Strings>("nfsClient"),
+                                    KeyOf<&State::nfs41Client, Strings>("nfs41Client")};
+
+// A top-level key of the state and how it is read.
+struct TopField {
+    const char* key;
+    TopKey bit;
+    void (*read)(State&, const json&, const Where&);
+};
+
+const TopField kTopFields[] = {
+    {"features", TopKey::features, ReadFeatures},
+    {"advancedOptions", TopKey::advancedOptions, ReadAdvancedOptions},
+    {"behaviour", TopKey::behaviour,
+     [](State& st, const json& v, const Where& w) { ReadKeys(st, v, w, kBehaviourKeys); }},
+    // Elements are normally converted while the text streams in; this handles the rest.
+    {"fileSystems", TopKey::fileSystems,
+     [](State& st, const json& v, const Where& w) {
+         ReadListWithIds(st.fileSystems, st.nextFileSystemId, v, w, ReadFileSystem);
+     }},
+    {"pendingRescan", TopKey::pendingRescan, ReadPendingRescan},
+    {"unresolvedVolumes", TopKey::unresolvedVolumes,
+     [](State& st, const json& v, const Where& w) {
+         ReadListWithIds(st.unresolvedVolumes, st.nextUnresolvedId, v, w, ReadUnresolved);
+     }},
+    {"nfsExports", TopKey::nfsExports,
+     [](State& st, const json& v, const Where& w) { ReadRecords(st.nfsExports, v, w, kNfsExportKeys); }},
+    {"firewall", TopKey::firewall, [](State& st, const json& v, const Where& w) { ReadKeys(st, v, w, kFirewallKeys); }},
+    {"heaps", TopKey::heaps, [](State& st, const json& v, const Where& w) { ReadRecords(st.heaps, v, w, kHeapKeys); }},
+    {"pointerBlockCache", TopKey::pointerBlockCache,
+     [](State& st, const json& v, const Where& w) { ReadKeys(st.pointerBlockCache, v, w, kCacheKeys); }},
+    {"faults", TopKey::faults, [](State& st, const json& v, const Where& w) { ReadList(st.faults, v, w, ReadFault); }},
+};
+
 void ReadTopKey(State& st, const std::string& key, const json& value, const Where& at)
 {
-    long i = 0;
-    if (key == "features") {
-        ReadFeatures(st, value, at);
-        st.Mark(TopKey::features);
-    } else if (key == "advancedOptions") {
-        ReadAdvancedOptions(st, value, at);
-        st.Mark(TopKey::advancedOptions);
-    } else if (key == "behaviour") {
-        EachKey(value, at, [&](const std::string& k, const json& x, const Where& xAt) {
-            if (k != "tryMount")
-                UnknownKey(xAt);
-            st.tryMount = Bool(x, xAt);
-        });
-        st.Mark(TopKey::behaviour);
-    } else if (key == "fileSystems") {
-        // Elements are normally converted while the text streams in; this handles the rest.
-        for (const auto& item : Array(value, at)) {
-            st.fileSystems.push_back(ReadFileSystem(item, at[i++]));
-            st.fileSystems.back().id = st.nextFileSystemId++;
+    for (const auto& field : kTopFields) {
+        if (key == field.key) {
+            field.read(st, value, at);
+            st.Mark(field.bit);
+            return;
         }
-        st.Mark(TopKey::fileSystems);
-    } else if (key == "pendingRescan") {
-        ReadPendingRescan(st, value, at);
-        st.Mark(TopKey::pendingRescan);
-    } else if (key == "unresolvedVolumes") {
-        for (const auto& item : Array(value, at)) {
-            st.unresolvedVolumes.push_back(ReadUnresolved(item, at[i++]));
-            st.unresolvedVolumes.back().id = st.nextUnresolvedId++;
-        }
-        st.Mark(TopKey::unresolvedVolumes);
-    } else if (key == "nfsExports") {
-        for (const auto& item : Array(value, at)) {
-            NfsExport e;
-            EachKey(item, at[i++], [&](const std::string& k, const json& x, const Where& xAt) {
-                if (k == "host")
-                    e.host = Str(x, xAt);
-                else if (k == "share")
-                    e.share = Str(x, xAt);
-                else if (k == "capacity")
-                    e.capacity = Unsigned(x, xAt);
-                else if (k == "used")
-                    e.used = Unsigned(x, xAt);
-                else
-                    UnknownKey(xAt);
-            });
-            st.nfsExports.push_back(std::move(e));
-        }
-        st.Mark(TopKey::nfsExports);
-    } else if (key == "firewall") {
-        EachKey(value, at, [&](const std::string& k, const json& x, const Where& xAt) {
-            if (k == "nfsClient")
-                st.nfsClient = Strings(x, xAt);
-            else if (k == "nfs41Client")
-                st.nfs41Client = Strings(x, xAt);
-            else
-                UnknownKey(xAt);
-        });
-        st.Mark(TopKey::firewall);
-    } else if (key == "heaps") {
-        for (const auto& item : Array(value, at)) {
-            Heap h;
-            EachKey(item, at[i++], [&](const std::string& k, const json& x, const Where& xAt) {
-                if (k == "name")
-                    h.name = Str(x, xAt);
-                else if (k == "size")
-                    h.size = Unsigned(x, xAt);
-                else if (k == "maxSize")
-                    h.maxSize = Unsigned(x, xAt);
-                else
-                    UnknownKey(xAt);
-            });
-            st.heaps.push_back(std::move(h));
-        }
-        st.Mark(TopKey::heaps);
-    } else if (key == "pointerBlockCache") {
-        auto& c = st.pointerBlockCache;
-        EachKey(value, at, [&](const std::string& k, const json& x, const Where& xAt) {
-            if (k == "cacheSize")
-                c.cacheSize = Unsigned(x, xAt);
-            else if (k == "cacheSizeMax")
-                c.cacheSizeMax = Unsigned(x, xAt);
-            else if (k == "workingSet")
-                c.workingSet = Unsigned(x, xAt);
-            else if (k == "workingSetMax")
-                c.workingSetMax = Unsigned(x, xAt);
-            else if (k == "heapOverhead")
-                c.heapOverhead = Unsigned(x, xAt);
-            else if (k == "capacityMissRatio")
-                c.capacityMissRatio = Int32(x, xAt);
-            else
-                UnknownKey(xAt);
-        });
-        st.Mark(TopKey::pointerBlockCache);
-    } else if (key == "faults") {
-        for (const auto& item : Array(value, at)) {
-            Where itemAt = at[i++];
-            Fault f;
-            bool hasCall = false;
-            EachKey(item, itemAt, [&](const std::string& k, const json& x, const Where& xAt) {
-                if (k == "call") {
-                    f.call = Str(x, xAt);
-                    hasCall = true;
-                } else if (k == "target") {
-                    f.target = Str(x, xAt);
-                } else if (k == "message") {
-                    f.message = Str(x, xAt);
-                } else if (k == "skip") {
-                    f.skip = Unsigned(x, xAt);
-                } else if (k == "times") {
-                    f.times = Unsigned(x, xAt);
-                } else {
-                    UnknownKey(xAt);
-                }
-            });
-            if (!hasCall)
-                Fail(itemAt, "missing required key 'call'");
-            if (!item.contains("message"))
-                f.message = "Injected failure of " + f.call;
-            st.faults.push_back(std::move(f));
-        }
-        st.Mark(TopKey::faults);
-    } else {
-        UnknownKey(at);
     }
+    UnknownKey(at);
 }
 
 // The state text as the JSON reader sees it, with the one check the reader does not make
@@ -771,8 +714,7 @@ public:
 
     bool start_object(std::size_t)
     {
-        stack_.push_back(Place(json::value_t::object));
-        frames_.push_back(Frame{false, {}, 0});
+        Open(json::value_t::object);
         return true;
     }
     bool key(json::string_t& k)
@@ -785,25 +727,28 @@ public:
         slot_ = &(*stack_.back())[k];
         return true;
     }
-    bool end_object()
-    {
-        stack_.pop_back();
-        frames_.pop_back();
-        Completed();
-        return true;
-    }
+    bool end_object() { return Close(); }
     bool start_array(std::size_t)
     {
-        json* array = Place(json::value_t::array);
-        stack_.push_back(array);
-        frames_.push_back(Frame{true, {}, 0});
+        json* array = Open(json::value_t::array);
         if (stack_.size() == 2 && stack_[0]->is_object() && topKey_ == "fileSystems") {
             streamed_ = array;
             streamedCount_ = 0;
         }
         return true;
     }
-    bool end_array()
+    bool end_array() { return Close(); }
+
+    // Starts an object or array at the current place.
+    json* Open(json::value_t type)
+    {
+        json* container = Place(type);
+        stack_.push_back(container);
+        frames_.push_back(Frame{type == json::value_t::array, {}, 0});
+        return container;
+    }
+
+    bool Close()
     {
         stack_.pop_back();
         frames_.pop_back();
@@ -910,15 +855,6 @@ void WriteReindented(std::ostream& out, const ojson& value, const char* indent)
     out.write(text.data() + start, static_cast<std::streamsize>(text.size() - start));
 }
 
-template <typename T, typename F>
-ojson ListOf(const std::vector<T>& items, F&& convert)
-{
-    ojson list = ojson::array();
-    for (const auto& item : items)
-        list.push_back(convert(item));
-    return list;
-}
-
 // The demo host is built in place rather than parsed from text: it is what every run
 // without a state file starts from, so it must cost next to nothing.
 Record DemoFileSystem(State& st, const char* type, const char* volumeName, const char* uuid, std::uint64_t capacity,
@@ -955,14 +891,7 @@ HlfsFields& DemoHlfs(Record& r, const char* lvmUuid, std::int32_t qaxiState, std
 User DemoUser(const char* heartbeatUuid, const char* mac, std::uint32_t major, std::uint32_t minor, std::int64_t offset,
               std::uint8_t lockModeInUse)
 {
-    User u;
-    u.heartbeatUuid = heartbeatUuid;
-    u.macAddress = mac;
-    u.driverVersionMajor = major;
-    u.driverVersionMinor = minor;
-    u.heartbeatOffset = offset;
-    u.lockModeInUse = lockModeInUse;
-    return u;
+    return {heartbeatUuid, mac, major, minor, offset, lockModeInUse};
 }
 
 State BuildDemo()
@@ -1045,7 +974,7 @@ State BuildDemo()
     u.capacity = 536602476544;
     u.mountReason = 6;
     u.resignatureReason = 0;
-    u.extents.push_back({false, "naa.60060160a620310045b9e1d7f3c8a054", 3, 0, 511743, true});
+    u.extents.push_back({{"naa.60060160a620310045b9e1d7f3c8a054", 3}, 0, 511743, true});
     for (std::string_view key :
          {"volumeName", "uuid", "lvmUuid", "majorVersion", "capacity", "mountReason", "resignatureReason", "extents"})
         u.Mark(key);
@@ -1081,31 +1010,30 @@ FsKind KindOfType(std::string_view type)
     return FsKind::Plain;
 }
 
-const HlfsFields& FileSystemRecord::Hlfs() const
+namespace {
+
+// A kind-specific part of a record; its defaults while it has not been made.
+template <typename Part>
+const Part& PartOrDefaults(const std::unique_ptr<Part>& part)
 {
-    static const HlfsFields defaults;
-    return hlfs ? *hlfs : defaults;
+    static const Part defaults;
+    return part ? *part : defaults;
 }
 
-HlfsFields& FileSystemRecord::MutableHlfs()
+template <typename Part>
+Part& MadePart(std::unique_ptr<Part>& part)
 {
-    if (!hlfs)
-        hlfs = std::make_unique<HlfsFields>();
-    return *hlfs;
+    if (!part)
+        part = std::make_unique<Part>();
+    return *part;
 }
 
-const NfsFields& FileSystemRecord::Nfs() const
-{
-    static const NfsFields defaults;
-    return nfs ? *nfs : defaults;
-}
+} // namespace
 
-NfsFields& FileSystemRecord::MutableNfs()
-{
-    if (!nfs)
-        nfs = std::make_unique<NfsFields>();
-    return *nfs;
-}
+const HlfsFields& FileSystemRecord::Hlfs() const { return PartOrDefaults(hlfs); }
+HlfsFields& FileSystemRecord::MutableHlfs() { return MadePart(hlfs); }
+const NfsFields& FileSystemRecord::Nfs() const { return PartOrDefaults(nfs); }
+NfsFields& FileSystemRecord::MutableNfs() { return MadePart(nfs); }
 
 void ResolveDefaults(FileSystemRecord& fs)
 {
@@ -1277,9 +1205,7 @@ void Write(const State& st, std::ostream& out)
     }
     if (st.Has(TopKey::nfsExports) || !st.nfsExports.empty()) {
         key("nfsExports");
-        value(ListOf(st.nfsExports, [](const NfsExport& e) -> ojson {
-            return {{"host", e.host}, {"share", e.share}, {"capacity", e.capacity}, {"used", e.used}};
-        }));
+        value(ListOf(st.nfsExports, [](const NfsExport& e) { return WriteKeys(e, kNfsExportKeys); }));
     }
     if (st.Has(TopKey::firewall) || st.nfsClient || st.nfs41Client) {
         ojson firewall = ojson::object();
@@ -1292,31 +1218,23 @@ void Write(const State& st, std::ostream& out)
     }
     if (st.Has(TopKey::heaps) || !st.heaps.empty()) {
         key("heaps");
-        value(ListOf(st.heaps, [](const Heap& h) -> ojson {
-            return {{"name", h.name}, {"size", h.size}, {"maxSize", h.maxSize}};
-        }));
+        value(ListOf(st.heaps, [](const Heap& h) { return WriteKeys(h, kHeapKeys); }));
     }
     if (st.Has(TopKey::pointerBlockCache)) {
-        const auto& c = st.pointerBlockCache;
         key("pointerBlockCache");
-        value(ojson{{"cacheSize", c.cacheSize},
-                    {"cacheSizeMax", c.cacheSizeMax},
-                    {"workingSet", c.workingSet},
-                    {"workingSetMax", c.workingSetMax},
-                    {"heapOverhead", c.heapOverhead},
-                    {"capacityMissRatio", c.capacityMissRatio}});
+        value(WriteKeys(st.pointerBlockCache, kCacheKeys));
     }
     if (st.Has(TopKey::faults) || !st.faults.empty()) {
         key("faults");
-        value(ListOf(st.faults, [](const Fault& f) -> ojson {
-            ojson out = {{"call", f.call}};
-            if (f.target)
-                out["target"] = *f.target;
-            out["message"] = f.message;
-            if (f.skip)
-                out["skip"] = f.skip;
-            if (f.times)
-                out["times"] = *f.times;
+        value(ListOf(st.faults, [](const Fault& f) {
+            // Only the keys that are set.
+            ojson out = WriteKeys(f, kFaultKeys);
+            if (!f.target)
+                out.erase("target");
+            if (!f.skip)
+                out.erase("skip");
+            if (!f.times)
+                out.erase("times");
             return out;
         }));
     }

@@ -9,6 +9,7 @@
 #include <stdexcept>
 #include <string>
 #include <string_view>
+#include <type_traits>
 #include <unordered_map>
 #include <utility>
 #include <variant>
@@ -152,10 +153,37 @@ struct FileSystemRecord {
     NfsFields& MutableNfs();
 };
 
-struct UnresolvedExtent {
-    bool null = false;
-    std::string deviceName;
-    std::uint8_t partition = 0;
+template <typename>
+struct MemberOf;
+template <typename P, typename T>
+struct MemberOf<T P::*> {
+    using Part = P;
+};
+
+// The field `Member` of a volume's record, in whichever part holds it (the record itself, or
+// its HLFS or NFS part). Through a record that is not const, a missing part is made.
+template <auto Member, typename Record>
+auto& Field(Record& r)
+{
+    using Part = typename MemberOf<decltype(Member)>::Part;
+    constexpr bool reading = std::is_const_v<Record>;
+    if constexpr (std::is_same_v<Part, HlfsFields>) {
+        if constexpr (reading)
+            return r.Hlfs().*Member;
+        else
+            return r.MutableHlfs().*Member;
+    } else if constexpr (std::is_same_v<Part, NfsFields>) {
+        if constexpr (reading)
+            return r.Nfs().*Member;
+        else
+            return r.MutableNfs().*Member;
+    } else {
+        return r.*Member;
+    }
+}
+
+// An extent of a volume the host has not resolved: also where it lies on its device.
+struct UnresolvedExtent : Extent {
     std::int64_t start = 0;
     std::int64_t end = 0;
     bool impl = true;

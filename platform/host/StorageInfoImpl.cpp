@@ -15,11 +15,8 @@ using HostCtl::Storage::FileSystem;
 using HostCtl::Storage::HlFileSystem;
 using HostCtl::Storage::NetworkFileSystem;
 using HostCtl::Storage::NfsVersion;
-using HostSim::Model::FileSystemRecord;
-using HostSim::Model::FsKey;
-using HostSim::Model::FsKind;
-using HostSim::Model::State;
-using HostSim::Model::TopKey;
+// This file works on the host's state model throughout.
+using namespace HostSim::Model;
 using J = nlohmann::ordered_json;
 
 // Runs a call that is not made on one volume object: state check, then faults matched
@@ -215,33 +212,28 @@ public:
     }
 };
 
-class IntegerOptionObject final : public HostCtl::AdvancedIntegerOption {
+// One advanced option of either type; `call` names its GetValue in the journal.
+template <typename Interface, typename Value>
+class OptionObject final : public Interface {
 public:
-    IntegerOptionObject(std::string name, std::int64_t value) : name_(std::move(name)), value_(value) {}
-    std::string GetName() override { return name_; }
-    std::int64_t GetValue() override
+    OptionObject(const char* call, std::string name, Value value)
+        : call_(call), name_(std::move(name)), value_(std::move(value))
     {
-        return HostCall("AdvancedIntegerOption.GetValue", {name_}, nullptr, [&](State&) { return value_; });
+    }
+    std::string GetName() override { return name_; }
+    Value GetValue() override
+    {
+        return HostCall(call_, {name_}, nullptr, [&](State&) { return value_; });
     }
 
 private:
+    const char* call_;
     std::string name_;
-    std::int64_t value_;
+    Value value_;
 };
 
-class StringOptionObject final : public HostCtl::AdvancedStringOption {
-public:
-    StringOptionObject(std::string name, std::string value) : name_(std::move(name)), value_(std::move(value)) {}
-    std::string GetName() override { return name_; }
-    std::string GetValue() override
-    {
-        return HostCall("AdvancedStringOption.GetValue", {name_}, nullptr, [&](State&) { return value_; });
-    }
-
-private:
-    std::string name_;
-    std::string value_;
-};
+using IntegerOptionObject = OptionObject<HostCtl::AdvancedIntegerOption, std::int64_t>;
+using StringOptionObject = OptionObject<HostCtl::AdvancedStringOption, std::string>;
 
 class OptionGroupObject final : public HostCtl::AdvancedOptionGroup {
 public:
@@ -257,8 +249,10 @@ public:
                                     if (optionName != name)
                                         continue;
                                     if (const auto* number = std::get_if<std::int64_t>(&value))
-                                        return std::make_unique<IntegerOptionObject>(name, *number);
-                                    return std::make_unique<StringOptionObject>(name, std::get<std::string>(value));
+                                        return std::make_unique<IntegerOptionObject>("AdvancedIntegerOption.GetValue",
+                                                                                     name, *number);
+                                    return std::make_unique<StringOptionObject>("AdvancedStringOption.GetValue", name,
+                                                                                std::get<std::string>(value));
                                 }
                             }
                             Runtime::Throw("Advanced option '" + group_ + "/" + name + "' not found");
@@ -353,46 +347,46 @@ std::vector<std::unique_ptr<FileSystem>> StorageInfoImpl::GetFileSystems()
     });
 }
 
+namespace {
+
+// The first volume `find` finds by `key`, as a new object, or none.
+std::unique_ptr<FileSystem> FindFileSystem(std::string_view call, const std::string& key,
+                                           const FileSystemRecord* (*find)(std::string_view))
+{
+    return HostCall(call, {key}, nullptr, [&](State&) -> std::unique_ptr<FileSystem> {
+        const FileSystemRecord* fs = find(key);
+        return fs ? Objects::MakeFileSystem(*fs) : nullptr;
+    });
+}
+
+} // namespace
+
 std::unique_ptr<FileSystem> StorageInfoImpl::GetFileSystemByUuidEx(const std::string& uuid)
 {
     if (HostLinux::Active())
         return HostLinux::Storage::GetFileSystemByUuid("StorageInfoImpl.GetFileSystemByUuidEx", uuid);
-    return HostCall("StorageInfoImpl.GetFileSystemByUuidEx", {uuid}, nullptr,
-                    [&](State&) -> std::unique_ptr<FileSystem> {
-                        const FileSystemRecord* fs = Runtime::FirstByUuid(uuid);
-                        return fs ? Objects::MakeFileSystem(*fs) : nullptr;
-                    });
+    return FindFileSystem("StorageInfoImpl.GetFileSystemByUuidEx", uuid, Runtime::FirstByUuid);
 }
 
 std::unique_ptr<FileSystem> StorageInfoImpl::GetFileSystemByUUID(const std::string& uuid)
 {
     if (HostLinux::Active())
         return HostLinux::Storage::GetFileSystemByUuid("StorageInfoImpl.GetFileSystemByUUID", uuid);
-    return HostCall("StorageInfoImpl.GetFileSystemByUUID", {uuid}, nullptr, [&](State&) -> std::unique_ptr<FileSystem> {
-        const FileSystemRecord* fs = Runtime::FirstByUuid(uuid);
-        return fs ? Objects::MakeFileSystem(*fs) : nullptr;
-    });
+    return FindFileSystem("StorageInfoImpl.GetFileSystemByUUID", uuid, Runtime::FirstByUuid);
 }
 
 std::unique_ptr<FileSystem> StorageInfoImpl::GetFileSystemByLabel(const std::string& label)
 {
     if (HostLinux::Active())
         return HostLinux::Storage::GetFileSystemByLabel(label);
-    return HostCall("StorageInfoImpl.GetFileSystemByLabel", {label}, nullptr,
-                    [&](State&) -> std::unique_ptr<FileSystem> {
-                        const FileSystemRecord* fs = Runtime::FirstByVolumeName(label);
-                        return fs ? Objects::MakeFileSystem(*fs) : nullptr;
-                    });
+    return FindFileSystem("StorageInfoImpl.GetFileSystemByLabel", label, Runtime::FirstByVolumeName);
 }
 
 std::unique_ptr<FileSystem> StorageInfoImpl::GetFileSystemByPath(const std::string& path)
 {
     if (HostLinux::Active())
         return HostLinux::Storage::GetFileSystemByPath(path);
-    return HostCall("StorageInfoImpl.GetFileSystemByPath", {path}, nullptr, [&](State&) -> std::unique_ptr<FileSystem> {
-        const FileSystemRecord* fs = Runtime::FirstMountedByPath(path);
-        return fs ? Objects::MakeFileSystem(*fs) : nullptr;
-    });
+    return FindFileSystem("StorageInfoImpl.GetFileSystemByPath", path, Runtime::FirstMountedByPath);
 }
 
 std::vector<std::unique_ptr<HlFileSystem>> StorageInfoImpl::GetHlfsFileSystems(const std::string& filter)
@@ -627,18 +621,32 @@ void StorageInfoImpl::ExitNetworkFileSystemPreUnmount(const std::string& volumeN
     SetPreUnmount("StorageInfoImpl.ExitNetworkFileSystemPreUnmount", volumeName, false);
 }
 
+namespace {
+
+// Changes the firewall ruleset of `version` as call `call`; `change` throws when the change
+// cannot be made.
+template <typename F>
+void ChangeRuleset(std::string_view call, const std::string& ipMask, NfsVersion version, F&& change)
+{
+    const Runtime::JournalEntry journal{"", J::array({ipMask, static_cast<int>(version)})};
+    HostCall(call, {ipMask}, &journal, [&](State& st) {
+        auto& rules = Ruleset(st, version);
+        change(rules, std::find(rules.begin(), rules.end(), ipMask));
+        st.Mark(TopKey::firewall);
+        Runtime::MarkDirty();
+    });
+}
+
+} // namespace
+
 void StorageInfoImpl::AddNasFirewallConfig(const std::string& ipMask, NfsVersion version)
 {
     if (HostLinux::Active())
         return HostLinux::Storage::AddNasFirewallConfig(ipMask, version);
-    const Runtime::JournalEntry journal{"", J::array({ipMask, static_cast<int>(version)})};
-    HostCall("StorageInfoImpl.AddNasFirewallConfig", {ipMask}, &journal, [&](State& st) {
-        auto& rules = Ruleset(st, version);
-        if (std::find(rules.begin(), rules.end(), ipMask) != rules.end())
+    ChangeRuleset("StorageInfoImpl.AddNasFirewallConfig", ipMask, version, [&](auto& rules, auto it) {
+        if (it != rules.end())
             Runtime::Throw("IP/Mask '" + ipMask + "' already exists in ruleset " + RulesetName(version));
         rules.push_back(ipMask);
-        st.Mark(TopKey::firewall);
-        Runtime::MarkDirty();
     });
 }
 
@@ -646,15 +654,10 @@ void StorageInfoImpl::RemoveNasFirewallConfig(const std::string& ipMask, NfsVers
 {
     if (HostLinux::Active())
         return HostLinux::Storage::RemoveNasFirewallConfig(ipMask, version);
-    const Runtime::JournalEntry journal{"", J::array({ipMask, static_cast<int>(version)})};
-    HostCall("StorageInfoImpl.RemoveNasFirewallConfig", {ipMask}, &journal, [&](State& st) {
-        auto& rules = Ruleset(st, version);
-        auto it = std::find(rules.begin(), rules.end(), ipMask);
+    ChangeRuleset("StorageInfoImpl.RemoveNasFirewallConfig", ipMask, version, [&](auto& rules, auto it) {
         if (it == rules.end())
             Runtime::Throw("IP/Mask '" + ipMask + "' not found in ruleset " + RulesetName(version));
         rules.erase(it);
-        st.Mark(TopKey::firewall);
-        Runtime::MarkDirty();
     });
 }
 
