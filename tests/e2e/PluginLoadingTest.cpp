@@ -2,15 +2,11 @@
 // changed, or a library that is not a plug-in, is skipped with a warning naming it, and the
 // others still load.
 
-#include <fcntl.h>
 #include <pwd.h>
-#include <spawn.h>
 #include <sys/stat.h>
-#include <sys/wait.h>
 #include <unistd.h>
 
 #include <filesystem>
-#include <fstream>
 #include <functional>
 #include <string>
 #include <vector>
@@ -170,38 +166,18 @@ TEST(PluginFolder, NeverTheCurrentFolder)
     Plugin(folder / "lib/autocli/plugins/a.so");
     fs::copy_file(AUTOCLI_BINARY, folder / "autocli");
     const std::string libraries = fs::path(STORAGECLI_PLUGIN).parent_path().parent_path().parent_path().string();
-    const std::string script = "mount -t tmpfs none /proc || exit 99; cd \"$1\" && ./autocli storage filesystem list";
-    const std::vector<std::string> args{
-        "/usr/bin/unshare", "-m", "--propagation", "private", "/bin/sh", "-c", script, "sh", folder / ""};
-    std::vector<char*> argv;
-    for (const auto& arg : args)
-        argv.push_back(const_cast<char*>(arg.c_str()));
-    argv.push_back(nullptr);
-    const std::string out = folder / "out", err = folder / "err";
-    posix_spawn_file_actions_t actions;
-    posix_spawn_file_actions_init(&actions);
-    posix_spawn_file_actions_addopen(&actions, STDOUT_FILENO, out.c_str(), O_WRONLY | O_CREAT | O_TRUNC, 0600);
-    posix_spawn_file_actions_addopen(&actions, STDERR_FILENO, err.c_str(), O_WRONLY | O_CREAT | O_TRUNC, 0600);
-    std::vector<std::string> env{"PATH=/usr/sbin:/usr/bin:/sbin:/bin", "LD_LIBRARY_PATH=" + libraries,
-                                 "XDG_STATE_HOME=" + (folder / "xdg")};
-    std::vector<char*> envp;
-    for (auto& entry : env)
-        envp.push_back(entry.data());
-    envp.push_back(nullptr);
-    pid_t pid = -1;
-    ASSERT_EQ(posix_spawn(&pid, argv[0], &actions, nullptr, argv.data(), envp.data()), 0);
-    posix_spawn_file_actions_destroy(&actions);
-    int status = 0;
-    ::waitpid(pid, &status, 0);
-    if (WIFEXITED(status) && WEXITSTATUS(status) == 99)
+    // A clean environment: no AUTOCLI_PLUGIN_PATH, no state from the caller.
+    const std::string script = "mount -t tmpfs none /proc || exit 99; cd \"$1\" && exec env -i PATH=/usr/bin:/bin "
+                               "LD_LIBRARY_PATH=\"$2\" XDG_STATE_HOME=\"$1xdg\" ./autocli storage filesystem list";
+    const auto run = TestSupport::RunProgram(
+        {"/usr/bin/unshare", "-m", "--propagation", "private", "/bin/sh", "-c", script, "sh", folder / "", libraries});
+    if (run.exitCode == 99)
         GTEST_SKIP() << "cannot mount in a private namespace here";
-    EXPECT_TRUE(WIFEXITED(status) && WEXITSTATUS(status) == 3);
-    std::ifstream errText(err);
-    std::string line;
-    std::getline(errText, line);
-    EXPECT_EQ(line, "Cannot find the plug-in folder: the path of the running program is not known "
-                    "(set AUTOCLI_PLUGIN_PATH to an absolute folder).");
-    EXPECT_EQ(fs::file_size(out), 0u);
+    EXPECT_EQ(run.exitCode, 3);
+    EXPECT_EQ(run.err.substr(0, run.err.find('\n')),
+              "Cannot find the plug-in folder: the path of the running program is not known "
+              "(set AUTOCLI_PLUGIN_PATH to an absolute folder).");
+    EXPECT_EQ(run.out, "");
 }
 
 } // namespace

@@ -2,13 +2,11 @@
 
 #include <array>
 #include <functional>
-#include <optional>
 #include <regex>
 
 #include <gtest/gtest.h>
 
 #include "hostctl/Host.h"
-#include "hostctl/HostCtlException.h"
 #include "hostctl/Network.h"
 #include "hostctl/StorageInfoImpl.h"
 #include "support/HostErrors.h"
@@ -18,10 +16,7 @@ namespace {
 
 using HostCtl::Storage::NFS_VERSION_3;
 using HostCtl::Storage::NFS_VERSION_41;
-using KnxCtl::Storage::HlFileSystemImpl;
 using KnxCtl::Storage::StorageInfoImpl;
-using KnxCtl::Storage::UnresolvedHlfsExtentImpl;
-using KnxCtl::Storage::UnresolvedHlfsVolumeImpl;
 using namespace TestSupport; // ScopedHost, MessageOf
 using Fs = HostCtl::Storage::FileSystem;
 using Nfs = HostCtl::Storage::NetworkFileSystem;
@@ -225,198 +220,6 @@ TEST(HostOperations, NfsAddMountAndRemove)
 
     host.Reopen();
     EXPECT_EQ(Names(StorageInfoImpl().GetFileSystems()), (std::vector<std::string>{"taken", "wrong", "other41"}));
-}
-
-TEST(HostOperations, NfsBusyRemovalAndPreUnmount)
-{
-    ScopedHost host(R"({"fileSystems": [{"type": "NFS", "volumeName": "n", "busy": true},
-                                        {"type": "NFS41", "volumeName": "m"}]})");
-    StorageInfoImpl info;
-    EXPECT_EQ(MessageOf([&] { info.RemoveNetworkFileSystem("n"); }), "Volume 'n' is busy");
-    info.EnterNetworkFileSystemPreUnmount("n");
-    EXPECT_EQ(host.State()["fileSystems"][0]["preUnmount"], true);
-    info.ExitNetworkFileSystemPreUnmount("n");
-    EXPECT_EQ(host.State()["fileSystems"][0]["preUnmount"], false);
-    EXPECT_EQ(MessageOf([&] { info.EnterNetworkFileSystemPreUnmount("m"); }), "NFS volume 'm' not found");
-    EXPECT_EQ(info.GetFileSystems().size(), 2u);
-}
-
-TEST(HostOperations, FirewallRulesets)
-{
-    ScopedHost host(R"({"firewall": {"nfsClient": ["10.0.0.0/8"]}})");
-    StorageInfoImpl info;
-    struct Step {
-        bool add;
-        const char* entry;
-        HostCtl::Storage::NfsVersion version;
-        const char* message;
-    };
-    const Step steps[] = {
-        {true, "10.0.0.0/8", NFS_VERSION_3, "IP/Mask '10.0.0.0/8' already exists in ruleset nfsClient"},
-        {true, "10.0.0.0/8", NFS_VERSION_41, ""},
-        {true, "fd00::/64", NFS_VERSION_3, ""},
-        {false, "192.0.2.1", NFS_VERSION_41, "IP/Mask '192.0.2.1' not found in ruleset nfs41Client"},
-        {false, "10.0.0.0/8", NFS_VERSION_3, ""},
-        {false, "10.0.0.0/8", NFS_VERSION_3, "IP/Mask '10.0.0.0/8' not found in ruleset nfsClient"},
-    };
-    for (const auto& s : steps)
-        EXPECT_EQ(MessageOf([&] {
-                      s.add ? info.AddNasFirewallConfig(s.entry, s.version)
-                            : info.RemoveNasFirewallConfig(s.entry, s.version);
-                  }),
-                  s.message)
-            << s.entry;
-    EXPECT_EQ(info.GetNasFirewallConfigs(NFS_VERSION_3), (std::vector<std::string>{"fd00::/64"}));
-    EXPECT_EQ(info.GetNasFirewallConfigs(NFS_VERSION_41), (std::vector<std::string>{"10.0.0.0/8"}));
-    EXPECT_EQ(host.State()["firewall"]["nfs41Client"], nlohmann::json::array({"10.0.0.0/8"}));
-}
-
-TEST(HostOperations, SnapshotsMountAndResignature)
-{
-    ScopedHost host(R"({
-      "fileSystems": [{"type": "HLFS", "volumeName": "ds", "uuid": "u-ds"}],
-      "unresolvedVolumes": [
-        {"volumeName": "ds", "uuid": "u-ds", "lvmUuid": "l", "majorVersion": 5, "capacity": 77, "mountReason": 6,
-         "extents": [{"deviceName": "e1", "partition": 2, "start": 5, "end": 9}, null,
-                     {"deviceName": "e3", "impl": false}]},
-        null,
-        {"volumeName": "old", "uuid": "u-old", "resignatureReason": 3},
-        {"volumeName": "foreign", "impl": false}]})");
-    StorageInfoImpl info;
-    auto copies = info.GetUnresolvedVolumes();
-    ASSERT_EQ(copies.size(), 4u);
-    EXPECT_EQ(copies[1], nullptr);
-    EXPECT_EQ(dynamic_cast<UnresolvedHlfsVolumeImpl*>(copies[3].get()), nullptr);
-    auto* replica = dynamic_cast<UnresolvedHlfsVolumeImpl*>(copies[0].get());
-    auto* old = dynamic_cast<UnresolvedHlfsVolumeImpl*>(copies[2].get());
-    ASSERT_TRUE(replica && old);
-
-    auto extents = replica->GetExtents();
-    ASSERT_EQ(extents.size(), 3u);
-    auto* first = dynamic_cast<UnresolvedHlfsExtentImpl*>(extents[0].get());
-    ASSERT_NE(first, nullptr);
-    EXPECT_EQ(first->GetDeviceName() + ":" + std::to_string(first->GetPartition()), "e1:2");
-    EXPECT_EQ(first->GetEnd() - first->GetStart(), 4);
-    EXPECT_EQ(extents[1], nullptr);
-    EXPECT_EQ(dynamic_cast<UnresolvedHlfsExtentImpl*>(extents[2].get()), nullptr);
-    EXPECT_EQ(extents[2]->GetDeviceName(), "e3");
-
-    struct Check {
-        UnresolvedHlfsVolumeImpl* copy;
-        bool second;
-        bool result;
-        unsigned code;
-    };
-    for (const auto& c : {Check{replica, true, false, 6}, Check{replica, false, true, 0}, Check{old, true, true, 0},
-                          Check{old, false, false, 3}}) {
-        unsigned code = 99;
-        EXPECT_EQ(c.copy->CanResolve(false, c.second, &code), c.result);
-        EXPECT_EQ(code, c.code);
-    }
-    EXPECT_EQ(MessageOf([&] { replica->Mount(false, true); }), "Cannot mount snapshot 'ds': reason code 6");
-    EXPECT_EQ(MessageOf([&] { old->Resignature(); }), "Cannot resignature snapshot 'old': reason code 3");
-    EXPECT_EQ(info.GetUnresolvedVolumes().size(), 4u);
-
-    auto resignatured = replica->Resignature();
-    const std::string uuid = resignatured->GetUuid();
-    EXPECT_NE(uuid, "u-ds");
-    EXPECT_EQ(resignatured->GetVolumeName(), "snap-" + uuid.substr(0, 8) + "-ds");
-    auto* hlfs = dynamic_cast<HlFileSystemImpl*>(resignatured.get());
-    ASSERT_NE(hlfs, nullptr);
-    EXPECT_TRUE(hlfs->IsMounted());
-    EXPECT_EQ(hlfs->GetMajorVersion(), 5);
-    EXPECT_EQ(hlfs->GetLvmUuid(), "l");
-    EXPECT_EQ(hlfs->GetCapacity(), 77u);
-    EXPECT_EQ(hlfs->GetExtents().size(), 2u);
-    EXPECT_EQ(hlfs->GetExtents()[1]->GetDeviceName(), "e3");
-
-    auto mounted = old->Mount(false, true);
-    EXPECT_EQ(mounted->GetUuid(), "u-old");
-    EXPECT_EQ(Names(info.GetFileSystems()), (std::vector<std::string>{"ds", resignatured->GetVolumeName(), "old"}));
-    EXPECT_EQ(info.GetUnresolvedVolumes().size(), 2u);
-    EXPECT_EQ(MessageOf([&] { replica->GetUuid(); }), "Snapshot 'ds' no longer exists");
-
-    // The same state resignatures to the same UUID every time.
-    host.Reopen();
-    EXPECT_EQ(StorageInfoImpl().GetFileSystemByUUID(uuid)->GetVolumeName(), "snap-" + uuid.substr(0, 8) + "-ds");
-}
-
-TEST(HostOperations, HlfsOpenConvertAndSettings)
-{
-    ScopedHost host(R"({"fileSystems": [{"type": "HLFS", "volumeName": "v3", "uuid": "u3", "majorVersion": 3},
-                                        {"type": "HLFS", "volumeName": "v5", "majorVersion": 5},
-                                        {"type": "vfat", "volumeName": "boot", "uuid": "ub"}]})");
-    const std::pair<const char*, const char*> opens[] = {
-        {"/hlfs/volumes/u3", ""},
-        {"/hlfs/volumes/v5", ""},
-        {"/hlfs/volumes/boot", "Cannot open HLFS volume at '/hlfs/volumes/boot'"},
-        {"/hlfs/volumes/ub", "Cannot open HLFS volume at '/hlfs/volumes/ub'"},
-        {"/volumes/u3", "Cannot open HLFS volume at '/volumes/u3'"},
-    };
-    for (const auto& [path, message] : opens)
-        EXPECT_EQ(MessageOf([p = path] { HlFileSystemImpl fs(p); }), message) << path;
-
-    HlFileSystemImpl v3("/hlfs/volumes/v3");
-    HlFileSystemImpl v5("/hlfs/volumes/v5");
-    EXPECT_EQ(MessageOf([&] { v5.ConvertToVersion5(); }), "Volume 'v5' is not an HLFS-3 volume");
-    v3.ConvertToVersion5();
-    EXPECT_EQ(v3.GetMajorVersion(), 5);
-    EXPECT_EQ(MessageOf([&] { v3.ConvertToVersion5(); }), "Volume 'v3' is not an HLFS-3 volume");
-
-    const auto defaults = v5.GetUnmapProperty();
-    EXPECT_EQ(defaults.granularity, 1048576u);
-    EXPECT_EQ(defaults.priority + "/" + defaults.method, "low/priority");
-    v5.SetUnmapProperty({65536, "high", 100, 1, "fixed"});
-    v5.SetLockMode(0x10);
-    v5.SetClusteredHdskEnabled(true);
-    host.Reopen();
-    auto again = HlFileSystemImpl::GetHLFSFileSystemByLabel("v5");
-    EXPECT_EQ(again->GetUnmapProperty().method, "fixed");
-    EXPECT_EQ(again->GetUnmapProperty().bandwidth, 100);
-    EXPECT_EQ(again->GetLockMode(), 0x10u);
-    EXPECT_TRUE(again->IsClusteredHdskEnabled());
-    EXPECT_EQ(HlFileSystemImpl::GetHLFSFileSystemByUUID("ub"), nullptr);
-}
-
-TEST(HostOperations, UsersPointerBlockCacheHeapsAndOptions)
-{
-    ScopedHost host(R"({
-      "fileSystems": [{"type": "HLFS", "volumeName": "v", "users": [
-        {"heartbeatUuid": "a", "macAddress": "00:1E:67:C4:D2:A8", "live": false}, {"heartbeatUuid": "b"}]}],
-      "pointerBlockCache": {"cacheSize": 1, "cacheSizeMax": 2, "workingSet": 30, "workingSetMax": 40,
-                            "heapOverhead": 5, "capacityMissRatio": 6},
-      "heaps": [{"name": "hlfs3", "size": 10, "maxSize": 20}],
-      "advancedOptions": {"HLFS3": {"EnableOnlineATSUpgrade": 1, "Mode": "fast"}}})");
-    auto fs = HlFileSystemImpl::GetHLFSFileSystemByLabel("v");
-    EXPECT_EQ(fs->GetUsers(false).size(), 2u);
-    auto live = fs->GetUsers(true);
-    ASSERT_EQ(live.size(), 1u);
-    EXPECT_EQ(live[0].heartbeatUuid, "b");
-    EXPECT_EQ(fs->GetUsers(false)[0].macAddress.GetStringAddress(), "00:1e:67:c4:d2:a8");
-
-    HostCtl::Host* h = HostCtl::HostFactory::GetHost();
-    auto cache = h->GetStorageInfo()->GetPointerBlockCache();
-    EXPECT_EQ(cache->GetStatistics().capacityMissRatio, 6);
-    cache->ResetStatistics();
-    const auto stats = cache->GetStatistics();
-    EXPECT_EQ(stats.capacityMissRatio, 0);
-    EXPECT_EQ(stats.workingSetMax, 30u);
-    EXPECT_EQ(stats.cacheSizeMax, 2u);
-    EXPECT_EQ(host.State()["pointerBlockCache"]["workingSetMax"], 30);
-
-    auto heaps = h->GetHardwareInfo()->GetMemoryInfo()->GetHeapStats();
-    ASSERT_EQ(heaps.size(), 1u);
-    EXPECT_EQ(heaps[0]->name + "/" + std::to_string(heaps[0]->maxSize), "hlfs3/20");
-
-    auto group = h->GetAdvancedOptions()->GetOptionGroup("HLFS3");
-    auto option = group->GetOption("EnableOnlineATSUpgrade");
-    auto* number = dynamic_cast<HostCtl::AdvancedIntegerOption*>(option.get());
-    ASSERT_NE(number, nullptr);
-    EXPECT_EQ(number->GetValue(), 1);
-    EXPECT_EQ(dynamic_cast<HostCtl::AdvancedIntegerOption*>(group->GetOption("Mode").get()), nullptr);
-    EXPECT_EQ(MessageOf([&] { group->GetOption("Nope"); }), "Advanced option 'HLFS3/Nope' not found");
-    EXPECT_EQ(MessageOf([&] { h->GetAdvancedOptions()->GetOptionGroup("NFS"); }),
-              "Advanced option group 'NFS' not found");
 }
 
 } // namespace

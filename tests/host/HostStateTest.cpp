@@ -1,17 +1,10 @@
-// The state file: checking, persistence, the demo host and the session lock.
+// The state file: checking, persistence and where it is looked for.
 
-#include <fstream>
 #include <functional>
-#include <sstream>
-#include <stdexcept>
-#include <tuple>
 
 #include <ostream>
 
-#include <fcntl.h>
 #include <gtest/gtest.h>
-#include <sys/file.h>
-#include <unistd.h>
 
 #include "FeatureList.h"
 #include "host/HostSession.h"
@@ -26,14 +19,11 @@
 namespace {
 
 using namespace std::string_literals;
-using HostCtl::Lib::HostCtlException;
 using KnxCtl::Storage::StorageInfoImpl;
 using TestSupport::MessageOf;
 using TestSupport::ReadFile;
 using TestSupport::ScopedHost;
 using Fs = HostCtl::Storage::FileSystem;
-
-bool Exists(const std::string& path) { return ::access(path.c_str(), F_OK) == 0; }
 
 struct BadState {
     const char* name;
@@ -130,151 +120,6 @@ TEST_P(BadStateTest, EveryCallFailsWithTheMessageAndTheFileIsKept)
 
 INSTANTIATE_TEST_SUITE_P(Host, BadStateTest, ::testing::ValuesIn(kBadStates),
                          [](const auto& info) { return std::string(info.param.name); });
-
-// The demo host as a state file would describe it; the built-in one must be the same host.
-const char* const kDemoHostText = R"({
-  "features": {"102": true, "103": true, "104": true, "270": true},
-  "advancedOptions": {
-    "HLFS3": {"EnableOnlineATSUpgrade": 1, "MaxHeapSizeMB": 256},
-    "NFS": {"MaxVolumes": 8, "HeartbeatFrequency": 12},
-    "Misc": {"HostName": "host01.lab.example"}
-  },
-  "fileSystems": [
-    {
-      "type": "HLFS", "volumeName": "datastore1",
-      "uuid": "5f8d2a31-6c1e47b2-9a0f-001e67c4d2a8", "lvmUuid": "5f8d2a30-1b7c3d44-e2c1-001e67c4d2a8",
-      "capacity": 536602476544, "used": 193273528320, "qaxiState": 1,
-      "majorVersion": 6, "lockMode": 16, "atsSupport": 1,
-      "extents": [{"deviceName": "naa.600508b1001c7e4d2f9a8b3c6d5e4f10", "partition": 3}],
-      "users": [
-        {"heartbeatUuid": "5f8d2a35-0a4c8e21-77d3-001e67c4d2a8", "macAddress": "00:1e:67:c4:d2:a8",
-         "driverVersionMajor": 6, "driverVersionMinor": 82, "heartbeatOffset": 3145728, "lockModeInUse": 4},
-        {"heartbeatUuid": "5f8d2b11-4e9a0c37-1b62-001e67c4d310", "macAddress": "00:1e:67:c4:d3:10",
-         "driverVersionMajor": 6, "driverVersionMinor": 82, "heartbeatOffset": 3149824, "lockModeInUse": 4}
-      ]
-    },
-    {
-      "type": "HLFS", "volumeName": "shared-ds01",
-      "uuid": "5f8d2b02-91a0c3e5-4d21-001e67c4d2a8", "lvmUuid": "5f8d2b01-7ac4e0d9-3f18-001e67c4d2a8",
-      "capacity": 2198754820096, "used": 1319413953331, "qaxiState": 1,
-      "majorVersion": 5, "lockMode": 0, "atsSupport": 1,
-      "extents": [
-        {"deviceName": "naa.60060160a62031002f7c8e4b9d1a5e21", "partition": 1},
-        {"deviceName": "naa.60060160a62031003a8d9f5c0e2b6f32", "partition": 1}
-      ],
-      "users": [
-        {"heartbeatUuid": "5f8d2b05-2c7e9a14-58b0-001e67c4d2a8", "macAddress": "00:1e:67:c4:d2:a8",
-         "driverVersionMajor": 5, "driverVersionMinor": 61, "heartbeatOffset": 3407872, "lockModeInUse": 0}
-      ],
-      "unmapProperty": {"granularity": 1048576, "priority": "none", "bandwidth": 0, "reserved": 0, "method": "priority"}
-    },
-    {
-      "type": "HLFS", "volumeName": "legacy-ds03",
-      "uuid": "4e1c7a90-2d3b5f68-8c17-001e67c4d2a8", "lvmUuid": "4e1c7a8f-93e0b2d6-0a45-001e67c4d2a8",
-      "capacity": 268435456000, "used": 107374182400, "qaxiState": 2,
-      "majorVersion": 3, "lockMode": 0, "atsSupport": 1,
-      "extents": [{"deviceName": "naa.600508b1001c5a3b4c2d1e0f9a8b7c61", "partition": 1}]
-    },
-    {
-      "type": "NFS", "volumeName": "nfs-iso", "uuid": "b7e21c4f-09d3a6e8",
-      "remoteHost": "10.20.30.40", "remoteShare": "/exports/iso",
-      "capacity": 1099511627776, "used": 412316860416, "readOnly": true,
-      "knxnic": "", "knxnics": "", "connections": 1, "maxQueueDepth": 64
-    },
-    {
-      "type": "NFS41", "volumeName": "nfs41-vms", "uuid": "c4a9d0e2-5b8f1736",
-      "remoteHosts": ["10.20.30.41", "10.20.30.42"], "remoteShare": "/exports/vms",
-      "capacity": 4398046511104, "used": 1649267441664, "securityType": 1
-    },
-    {
-      "type": "vfat", "volumeName": "BOOTBANK1", "uuid": "6a3f1e2d-8b4c5a69-0d7e-001e67c4d2a8",
-      "capacity": 4293591040, "used": 1438646272
-    }
-  ],
-  "unresolvedVolumes": [
-    {
-      "volumeName": "datastore1", "uuid": "5f8d2a31-6c1e47b2-9a0f-001e67c4d2a8",
-      "lvmUuid": "5f8d2a30-1b7c3d44-e2c1-001e67c4d2a8", "majorVersion": 6, "capacity": 536602476544,
-      "mountReason": 6, "resignatureReason": 0,
-      "extents": [{"deviceName": "naa.60060160a620310045b9e1d7f3c8a054", "partition": 3, "start": 0, "end": 511743}]
-    }
-  ],
-  "nfsExports": [
-    {"host": "10.20.30.40", "share": "/exports/iso", "capacity": 1099511627776, "used": 412316860416},
-    {"host": "10.20.30.41", "share": "/exports/vms", "capacity": 4398046511104, "used": 1649267441664},
-    {"host": "10.20.30.42", "share": "/exports/vms", "capacity": 4398046511104, "used": 1649267441664},
-    {"host": "10.20.30.40", "share": "/exports/backup", "capacity": 2199023255552, "used": 329853488332}
-  ],
-  "firewall": {
-    "nfsClient": ["10.20.30.0/24", "fd00:20:30::/64"],
-    "nfs41Client": ["10.20.30.41", "10.20.30.42"]
-  },
-  "heaps": [
-    {"name": "hlfs3", "size": 22020096, "maxSize": 268435456},
-    {"name": "nfsclient", "size": 4194304, "maxSize": 33554432}
-  ],
-  "pointerBlockCache": {
-    "cacheSize": 134217728, "cacheSizeMax": 268435456, "workingSet": 35184372088832,
-    "workingSetMax": 43980465111040, "heapOverhead": 4194304, "capacityMissRatio": 3
-  }
-})";
-
-TEST(HostState, BuiltInDemoHostIsTheDescribedOne)
-{
-    std::istringstream in(kDemoHostText);
-    const auto described = HostSim::Model::Parse(in, "demo text");
-    const auto builtIn = HostSim::Model::Demo();
-    std::ostringstream expected, actual;
-    HostSim::Model::Write(described, expected);
-    HostSim::Model::Write(builtIn, actual);
-    EXPECT_EQ(actual.str(), expected.str());
-    EXPECT_EQ(builtIn.present, described.present);
-    ASSERT_EQ(builtIn.fileSystems.size(), described.fileSystems.size());
-    for (std::size_t i = 0; i < builtIn.fileSystems.size(); ++i) {
-        const auto& a = builtIn.fileSystems[i];
-        const auto& b = described.fileSystems[i];
-        EXPECT_EQ(std::tie(a.id, a.kind, a.name, a.mountPoint, a.present),
-                  std::tie(b.id, b.kind, b.name, b.mountPoint, b.present))
-            << i;
-        EXPECT_EQ(a.Nfs().readOnlyState, b.Nfs().readOnlyState) << i;
-        EXPECT_EQ(a.Nfs().connectionsParam, b.Nfs().connectionsParam) << i;
-        EXPECT_EQ(a.Nfs().securityType, b.Nfs().securityType) << i;
-        EXPECT_EQ(static_cast<bool>(a.hlfs), static_cast<bool>(b.hlfs)) << i;
-        EXPECT_EQ(static_cast<bool>(a.nfs), static_cast<bool>(b.nfs)) << i;
-    }
-    EXPECT_EQ(builtIn.nextFileSystemId, described.nextFileSystemId);
-    ASSERT_EQ(builtIn.unresolvedVolumes.size(), 1u);
-    EXPECT_EQ(builtIn.unresolvedVolumes[0].present, described.unresolvedVolumes[0].present);
-    EXPECT_EQ(builtIn.nextUnresolvedId, described.nextUnresolvedId);
-}
-
-TEST(HostState, DemoHostIsWrittenOnlyByTheFirstChange)
-{
-    ScopedHost host("");
-    {
-        StorageInfoImpl info;
-        EXPECT_EQ(info.GetFileSystems().size(), 6u);
-        EXPECT_EQ(info.GetUnresolvedVolumes().size(), 1u);
-        info.AutoFullMountVolumes(); // everything is mounted already: no change
-        EXPECT_THROW(info.RemoveNasFirewallConfig("192.0.2.1", HostCtl::Storage::NFS_VERSION_3), HostCtlException);
-    }
-    for (int feature : {102, 103, 104, 270})
-        EXPECT_EQ(*FeatureList[feature], 1) << feature;
-    EXPECT_FALSE(Exists(host.StatePath()));
-    const std::string demo = HostSim::DumpState();
-
-    StorageInfoImpl().AddNasFirewallConfig("192.0.2.1", HostCtl::Storage::NFS_VERSION_3);
-    EXPECT_FALSE(Exists(host.StatePath())); // saved when the command ends
-    HostSim::SaveChanges();
-    ASSERT_TRUE(Exists(host.StatePath()));
-    nlohmann::json expected = nlohmann::json::parse(demo);
-    expected["firewall"]["nfsClient"].push_back("192.0.2.1");
-    EXPECT_EQ(host.State(), expected);
-
-    host.Reopen();
-    auto rules = StorageInfoImpl().GetNasFirewallConfigs(HostCtl::Storage::NFS_VERSION_3);
-    EXPECT_EQ(rules.back(), "192.0.2.1");
-}
 
 TEST(HostState, SavingKeepsEveryKeyAndExactValues)
 {
