@@ -6,14 +6,12 @@
 #include <vector>
 
 #include <gtest/gtest.h>
-#include <nlohmann/json.hpp>
 
 #include "RegisteredCommand.h"
 #include "nfs/Manifest.h"
 #include "support/HostFixture.h"
 
 using namespace OrvaneCli::FileSystem;
-using nlohmann::json;
 
 namespace {
 
@@ -50,22 +48,18 @@ TEST(NfsListTest, TranslationsCoverEveryKnownValueAndFallBack)
 TEST(NfsListTest, SwitchesChooseFieldsAndNeverLeakAcrossVersions)
 {
     const struct {
-        bool f102, f103, f104;
+        const char* features;
         std::vector<std::string> v3List, v41List, v3Params, v41Params;
         const char* v3Hint;
     } cases[] = {
-        {false,
-         false,
-         false,
+        {R"({"102": false, "103": false, "104": false})",
          {"Volume Name", "Host", "Share", "Accessible", "Mounted", "Read-Only", "isPE", "Hardware Acceleration"},
          {"Volume Name", "Host(s)", "Share", "Accessible", "Mounted", "Read-Only", "Security", "isPE",
           "Hardware Acceleration"},
          {"Volume Name", "MaxQueueDepth", "MaxReadTransferSize", "MaxWriteTransferSize"},
          {"Volume Name", "MaxQueueDepth", "MaxReadTransferSize", "MaxWriteTransferSize"},
          "Volume Name,Host,Share,Accessible,Mounted,Read-Only,isPE,Hardware Acceleration"},
-        {false,
-         true,
-         true,
+        {R"({"102": false, "103": true, "104": true})",
          {"Volume Name", "Host", "Share", "Knxnic", "Connections", "Accessible", "Mounted", "Read-Only", "isPE",
           "Hardware Acceleration"},
          {"Volume Name", "Host(s)", "Share", "Accessible", "Mounted", "Read-Only", "Security", "isPE",
@@ -73,9 +67,7 @@ TEST(NfsListTest, SwitchesChooseFieldsAndNeverLeakAcrossVersions)
          {"Volume Name", "MaxQueueDepth", "MaxReadTransferSize", "MaxWriteTransferSize", "Knxnic", "Connections"},
          {"Volume Name", "MaxQueueDepth", "MaxReadTransferSize", "MaxWriteTransferSize"},
          "Volume Name,Host,Share,Knxnic,Accessible,Mounted,Connections,Read-Only,isPE,Hardware Acceleration"},
-        {true,
-         true,
-         false,
+        {R"({"102": true, "103": true, "104": false})",
          {"Volume Name", "Host", "Share", "Connections", "Accessible", "Mounted", "Read-Only", "isPE",
           "Hardware Acceleration"},
          {"Volume Name", "Host(s)", "Share", "Knxnics", "Accessible", "Mounted", "Read-Only", "Security", "isPE",
@@ -83,9 +75,7 @@ TEST(NfsListTest, SwitchesChooseFieldsAndNeverLeakAcrossVersions)
          {"Volume Name", "MaxQueueDepth", "MaxReadTransferSize", "MaxWriteTransferSize", "Connections"},
          {"Volume Name", "MaxQueueDepth", "MaxReadTransferSize", "MaxWriteTransferSize", "Knxnics"},
          "Volume Name,Host,Share,Accessible,Mounted,Connections,Read-Only,isPE,Hardware Acceleration"},
-        {false,
-         false,
-         true,
+        {R"({"102": false, "103": false, "104": true})",
          {"Volume Name", "Host", "Share", "Knxnic", "Accessible", "Mounted", "Read-Only", "isPE",
           "Hardware Acceleration"},
          {"Volume Name", "Host(s)", "Share", "Accessible", "Mounted", "Read-Only", "Security", "isPE",
@@ -95,8 +85,8 @@ TEST(NfsListTest, SwitchesChooseFieldsAndNeverLeakAcrossVersions)
          "Volume Name,Host,Share,Knxnic,Accessible,Mounted,Read-Only,isPE,Hardware Acceleration"},
     };
     for (const auto& c : cases) {
-        SCOPED_TRACE(::testing::Message() << "102=" << c.f102 << " 103=" << c.f103 << " 104=" << c.f104);
-        TestSupport::ScopedHost host(json{{"features", {{"102", c.f102}, {"103", c.f103}, {"104", c.f104}}}}.dump());
+        SCOPED_TRACE(c.features);
+        TestSupport::ScopedHost host(std::string(R"({"features": )") + c.features + "}");
         EXPECT_EQ(Titles("storage nfs list"), c.v3List);
         EXPECT_EQ(Titles("storage nfs41 list"), c.v41List);
         EXPECT_EQ(Titles("storage nfs param get"), c.v3Params);

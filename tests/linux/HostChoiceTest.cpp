@@ -3,146 +3,91 @@
 
 #include <gtest/gtest.h>
 
-#include <nlohmann/json.hpp>
-
 #include "LinuxTestSupport.h"
 
 namespace {
 
-struct ChoiceCase {
-    const char* name;
-    std::vector<std::string> args;
+struct Case {
+    std::string args; // autocli's words, split at spaces
     std::vector<std::string> env;
     int exitCode;
+    const char* out; // exact standard output ("" to skip the check)
     const char* err; // a part of standard error ("" for none expected)
 };
+
+void ExpectRuns(const std::vector<Case>& cases, const std::string& prefix, const std::vector<std::string>& env)
+{
+    for (const auto& c : cases) {
+        SCOPED_TRACE(prefix + c.args);
+        auto allEnv = env;
+        allEnv.insert(allEnv.end(), c.env.begin(), c.env.end());
+        const auto ran = LinuxTest::Autocli(LinuxTest::Words(prefix + c.args), allEnv);
+        EXPECT_EQ(ran.exitCode, c.exitCode) << ran.out << ran.err;
+        if (*c.out)
+            EXPECT_EQ(ran.out, c.out);
+        if (*c.err)
+            EXPECT_NE(ran.err.find(c.err), std::string::npos) << ran.err;
+        else
+            EXPECT_EQ(ran.err, "");
+    }
+}
 
 TEST(HostChoice, UsageErrorsAndChoices)
 {
     LinuxTest::TempDir dir;
     const std::string state = dir.Path() + "/host.json";
     LinuxTest::WriteFile(state, "{}");
+    const std::string list = " storage filesystem list";
+    const char* const stateRefused = "Option '--state' cannot be used with the Linux host.";
     const std::string linuxDir = "AUTOCLI_LINUX_DIR=" + dir.Path() + "/linux";
-    const ChoiceCase cases[] = {
-        {"unknown name",
-         {"--host", "vm", "storage", "filesystem", "list"},
-         {},
-         2,
-         "Unknown host 'vm': use sim or linux."},
-        {"no value", {"--host"}, {}, 2, "Option '--host' needs a value."},
-        {"twice",
-         {"--host", "linux", "--host", "sim", "storage", "filesystem", "list"},
-         {},
-         2,
-         "Option '--host' given more than once."},
-        {"after the path",
-         {"storage", "--host", "linux", "filesystem", "list"},
-         {},
-         2,
-         "Option '--host' must come before the command path."},
-        {"with --state",
-         {"--host", "linux", "--state", state, "storage", "filesystem", "list"},
-         {},
-         2,
-         "Option '--state' cannot be used with the Linux host."},
-        {"with --dump-state",
-         {"--host", "linux", "--dump-state"},
-         {},
-         2,
-         "Option '--dump-state' cannot be used with the Linux host."},
-        {"variable with --state",
-         {"--state", state, "storage", "filesystem", "list"},
-         {"AUTOCLI_HOST=linux"},
-         2,
-         "Option '--state' cannot be used with the Linux host."},
-        {"unknown variable",
-         {"storage", "filesystem", "list"},
-         {"AUTOCLI_HOST=xen"},
-         2,
-         "Unknown host 'xen' in AUTOCLI_HOST"},
-        {"option wins over variable",
-         {"--host", "sim", "--state", state, "storage", "filesystem", "list"},
-         {"AUTOCLI_HOST=linux"},
-         0,
-         ""},
-        {"variable chooses linux", {"storage", "hlfs", "extent", "list"}, {"AUTOCLI_HOST=linux", linuxDir}, 0, ""},
-        {"empty variable is sim", {"--state", state, "storage", "filesystem", "list"}, {"AUTOCLI_HOST="}, 0, ""},
-        {"version needs no host", {"--version"}, {"AUTOCLI_HOST=xen"}, 0, ""},
-    };
-    for (const auto& c : cases) {
-        SCOPED_TRACE(c.name);
-        const auto ran = LinuxTest::Autocli(c.args, c.env);
-        EXPECT_EQ(ran.exitCode, c.exitCode) << ran.out << ran.err;
-        if (*c.err) {
-            EXPECT_NE(ran.err.find(c.err), std::string::npos) << ran.err;
-        } else {
-            EXPECT_EQ(ran.err, "");
-        }
-    }
+    ExpectRuns(
+        {
+            {"--host vm" + list, {}, 2, "", "Unknown host 'vm': use sim or linux."},
+            {"--host", {}, 2, "", "Option '--host' needs a value."},
+            {"--host linux --host sim" + list, {}, 2, "", "Option '--host' given more than once."},
+            {"storage --host linux filesystem list", {}, 2, "", "Option '--host' must come before the command path."},
+            {"--host linux --state " + state + list, {}, 2, "", stateRefused},
+            {"--host linux --dump-state", {}, 2, "", "Option '--dump-state' cannot be used with the Linux host."},
+            {"--state " + state + list, {"AUTOCLI_HOST=linux"}, 2, "", stateRefused},
+            {list, {"AUTOCLI_HOST=xen"}, 2, "", "Unknown host 'xen' in AUTOCLI_HOST"},
+            {"--host sim --state " + state + list, {"AUTOCLI_HOST=linux"}, 0, "", ""},
+            {"storage hlfs extent list", {"AUTOCLI_HOST=linux", linuxDir}, 0, "", ""},
+            {"--state " + state + list, {"AUTOCLI_HOST="}, 0, "", ""},
+            {"--version", {"AUTOCLI_HOST=xen"}, 0, "", ""},
+        },
+        "", {});
 }
-
-struct AnswerCase {
-    const char* name;
-    std::vector<std::string> args;
-    int exitCode;
-    const char* out; // exact standard output ("" to skip the check)
-    const char* err; // a part of standard error ("" for none expected)
-};
 
 // What Linux has no equivalent for: empty HLFS lists, "not found" for HLFS look-ups, and
 // "not available" for operations. None of these reads or changes anything on the machine.
 TEST(HostChoice, LinuxAnswersWhereItHasNoEquivalent)
 {
     LinuxTest::TempDir dir;
-    const std::vector<std::string> env{"AUTOCLI_LINUX_DIR=" + dir.Path() + "/linux"};
-    const AnswerCase cases[] = {
-        {"extent list", {"storage", "hlfs", "extent", "list"}, 0, "[]\n", ""},
-        {"snapshot list", {"storage", "hlfs", "snapshot", "list"}, 0, "[]\n", ""},
-        {"lock mode list", {"storage", "hlfs", "lockmode", "list"}, 0, "[]\n", ""},
-        {"host list",
-         {"storage", "hlfs", "host", "list", "-l", "ds1"},
-         1,
-         "",
-         "HLFS volume with label ds1 could not be found."},
-        {"upgrade", {"storage", "hlfs", "upgrade", "-l", "ds1"}, 1, "", "Cannot find HLFS volume with label ds1"},
-        {"snapshot mount",
-         {"storage", "hlfs", "snapshot", "mount", "-l", "ds1"},
-         1,
-         "",
-         "No unresolved HLFS snapshots with volume label 'ds1' found."},
-        {"pointer block cache",
-         {"storage", "hlfs", "pbcache", "reset"},
-         1,
-         "",
-         "StorageInfo.GetPointerBlockCache is not available on a Linux host"},
-        {"heap statistics",
-         {"storage", "hlfs", "pbcache", "get"},
-         1,
-         "",
-         "MemoryInfo.GetHeapStats is not available on a Linux host"},
-        {"rescan", {"storage", "filesystem", "rescan"}, 0, "true\n", ""},
-        {"automount with nothing registered", {"storage", "filesystem", "automount"}, 0, "true\n", ""},
-        {"unmount all HLFS", {"storage", "filesystem", "unmount", "-a"}, 0, "true\n", ""},
-        {"mount unknown",
-         {"storage", "filesystem", "mount", "-l", "nothing"},
-         1,
-         "",
-         "No volume with label 'nothing' was found"},
-        {"parameters of an unknown volume", {"storage", "nfs", "param", "get", "-v", "nothing"}, 0, "[]\n", ""},
-    };
-    for (const auto& c : cases) {
-        SCOPED_TRACE(c.name);
-        std::vector<std::string> args{"--host", "linux", "--formatter", "json"};
-        args.insert(args.end(), c.args.begin(), c.args.end());
-        const auto ran = LinuxTest::Autocli(args, env);
-        EXPECT_EQ(ran.exitCode, c.exitCode) << ran.out << ran.err;
-        if (*c.out) {
-            EXPECT_EQ(ran.out, c.out);
-        }
-        if (*c.err) {
-            EXPECT_NE(ran.err.find(c.err), std::string::npos) << ran.err;
-        }
-    }
+    ExpectRuns(
+        {
+            {"storage hlfs extent list", {}, 0, "[]\n", ""},
+            {"storage hlfs snapshot list", {}, 0, "[]\n", ""},
+            {"storage hlfs lockmode list", {}, 0, "[]\n", ""},
+            {"storage hlfs host list -l ds1", {}, 1, "", "HLFS volume with label ds1 could not be found."},
+            {"storage hlfs upgrade -l ds1", {}, 1, "", "Cannot find HLFS volume with label ds1"},
+            {"storage hlfs snapshot mount -l ds1",
+             {},
+             1,
+             "",
+             "No unresolved HLFS snapshots with volume label 'ds1' found."},
+            {"storage hlfs pbcache reset",
+             {},
+             1,
+             "",
+             "StorageInfo.GetPointerBlockCache is not available on a Linux host"},
+            {"storage hlfs pbcache get", {}, 1, "", "MemoryInfo.GetHeapStats is not available on a Linux host"},
+            {"storage filesystem rescan", {}, 0, "true\n", ""},
+            {"storage filesystem automount", {}, 0, "true\n", ""},
+            {"storage filesystem unmount -a", {}, 0, "true\n", ""},
+            {"storage filesystem mount -l nothing", {}, 1, "", "No volume with label 'nothing' was found"},
+            {"storage nfs param get -v nothing", {}, 0, "[]\n", ""},
+        },
+        "--host linux --formatter json ", {"AUTOCLI_LINUX_DIR=" + dir.Path() + "/linux"});
 }
 
 // Feature switches on Linux: connections (103) on; the knxnic bindings (102, 104) and NAS
@@ -151,16 +96,15 @@ TEST(HostChoice, FeatureSwitchesOnLinux)
 {
     LinuxTest::TempDir dir;
     const std::vector<std::string> env{"AUTOCLI_LINUX_DIR=" + dir.Path()};
-    const auto add = LinuxTest::Autocli({"--host", "linux", "storage", "nfs", "add", "--help"}, env);
+    const auto add = LinuxTest::Autocli(LinuxTest::Words("--host linux storage nfs add --help"), env);
     EXPECT_NE(add.out.find("--connections"), std::string::npos) << add.out;
     EXPECT_EQ(add.out.find("knxnic"), std::string::npos) << add.out;
-    const auto add41 = LinuxTest::Autocli({"--host", "linux", "storage", "nfs41", "add", "--help"}, env);
+    const auto add41 = LinuxTest::Autocli(LinuxTest::Words("--host linux storage nfs41 add --help"), env);
     EXPECT_EQ(add41.out.find("knxnic"), std::string::npos) << add41.out;
-    const auto pre = LinuxTest::Autocli({"--host", "linux", "storage", "nfs", "preunmount", "--help"}, env);
-    EXPECT_EQ(pre.exitCode, 2) << pre.out;
+    EXPECT_EQ(LinuxTest::Autocli(LinuxTest::Words("--host linux storage nfs preunmount --help"), env).exitCode, 2);
     // The simulated demo host has all four on.
     LinuxTest::TempDir sim;
-    const auto demo = LinuxTest::Autocli({"storage", "nfs", "add", "--help"}, {"XDG_STATE_HOME=" + sim.Path()});
+    const auto demo = LinuxTest::Autocli(LinuxTest::Words("storage nfs add --help"), {"XDG_STATE_HOME=" + sim.Path()});
     EXPECT_NE(demo.out.find("knxnic"), std::string::npos) << demo.out;
 }
 

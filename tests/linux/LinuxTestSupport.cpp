@@ -28,6 +28,25 @@ Ran Autocli(const std::vector<std::string>& args, const std::vector<std::string>
     return TestSupport::RunAutocli(args, "", env);
 }
 
+std::string ErrorOf(const std::function<void()>& body)
+{
+    try {
+        body();
+    } catch (const std::runtime_error& e) {
+        return e.what();
+    }
+    return "<no error>";
+}
+
+std::vector<std::string> Words(const std::string& line)
+{
+    std::vector<std::string> words;
+    std::istringstream stream(line);
+    for (std::string word; stream >> word;)
+        words.push_back(word);
+    return words;
+}
+
 Ran RunInNamespaces(const std::vector<std::string>& flags, const std::string& script,
                     const std::vector<std::string>& env)
 {

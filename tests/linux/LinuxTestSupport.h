@@ -23,6 +23,12 @@ Ran Run(const std::vector<std::string>& args, const std::vector<std::string>& en
 // Runs autocli with `args`.
 Ran Autocli(const std::vector<std::string>& args, const std::vector<std::string>& env = {});
 
+// The message of the std::runtime_error `body` throws, or "<no error>".
+std::string ErrorOf(const std::function<void()>& body);
+
+// The words of `line`, split at spaces.
+std::vector<std::string> Words(const std::string& line);
+
 // Runs `script` with /bin/sh inside fresh namespaces made by unshare(1) (`flags`, e.g.
 // {"-n"} or {"-m", "--propagation", "private"}). The script finds autocli in $AUTOCLI.
 Ran RunInNamespaces(const std::vector<std::string>& flags, const std::string& script,

@@ -6,9 +6,6 @@
 
 #include <sys/stat.h>
 
-#include <map>
-#include <sstream>
-
 #include <nlohmann/json.hpp>
 
 #include "LinuxTestSupport.h"
@@ -17,6 +14,15 @@ namespace {
 
 const char* const kNoClient = "This kernel has no NFS client (nfs is not in /proc/filesystems)";
 
+// `listing` holds one row, with at least the given fields.
+void ExpectRow(const std::string& listing, const nlohmann::json& fields)
+{
+    const auto rows = nlohmann::json::parse(listing);
+    ASSERT_EQ(rows.size(), 1u) << listing;
+    for (const auto& [name, value] : fields.items())
+        EXPECT_EQ(rows[0][name], value) << name;
+}
+
 TEST(NfsVolumes, AddOnAKernelWithoutNfsClientSaysSoAndRecordsNothing)
 {
     if (LinuxTest::KernelHasNfsClient())
@@ -24,27 +30,18 @@ TEST(NfsVolumes, AddOnAKernelWithoutNfsClientSaysSoAndRecordsNothing)
     LinuxTest::TempDir dir;
     const std::string journal = dir.Path() + "/journal";
     const std::vector<std::string> env{"AUTOCLI_LINUX_DIR=" + dir.Path() + "/state", "AUTOCLI_JOURNAL=" + journal};
-    struct Case {
-        std::vector<std::string> args;
-        const char* call;
+    const std::pair<const char*, const char*> cases[] = {
+        {"nfs add -H 10.0.0.1 -s /export -v v3vol", "StorageInfoImpl.AddNetworkFileSystem"},
+        {"nfs add -H 10.0.0.1 -s /export -v v3vol -c 4 -r", "StorageInfoImpl.AddNetworkFileSystem"},
+        {"nfs41 add -H 10.0.0.1,10.0.0.2 -s /export -v v41vol -a krb5", "StorageInfoImpl.AddV41NetworkFileSystem"},
     };
-    const Case cases[] = {
-        {{"storage", "nfs", "add", "-H", "10.0.0.1", "-s", "/export", "-v", "v3vol"},
-         "StorageInfoImpl.AddNetworkFileSystem"},
-        {{"storage", "nfs", "add", "-H", "10.0.0.1", "-s", "/export", "-v", "v3vol", "-c", "4", "-r"},
-         "StorageInfoImpl.AddNetworkFileSystem"},
-        {{"storage", "nfs41", "add", "-H", "10.0.0.1,10.0.0.2", "-s", "/export", "-v", "v41vol", "-a", "krb5"},
-         "StorageInfoImpl.AddV41NetworkFileSystem"},
-    };
-    for (const auto& c : cases) {
-        SCOPED_TRACE(c.args[3] + " " + c.args[8]);
-        std::vector<std::string> args{"--host", "linux"};
-        args.insert(args.end(), c.args.begin(), c.args.end());
-        const auto ran = LinuxTest::Autocli(args, env);
+    for (const auto& [words, call] : cases) {
+        SCOPED_TRACE(words);
+        const auto ran = LinuxTest::Autocli(LinuxTest::Words(std::string("--host linux storage ") + words), env);
         EXPECT_EQ(ran.exitCode, 1) << ran.out << ran.err;
         EXPECT_EQ(ran.err, std::string(kNoClient) + "\n");
         const std::string lines = LinuxTest::ReadFile(journal);
-        EXPECT_NE(lines.find(std::string("\"call\":\"") + c.call + "\""), std::string::npos) << lines;
+        EXPECT_NE(lines.find(std::string("\"call\":\"") + call + "\""), std::string::npos) << lines;
         EXPECT_NE(lines.find(kNoClient), std::string::npos) << lines;
     }
     // Nothing was recorded, no folder was made for a volume that can never be mounted here.
@@ -60,12 +57,9 @@ TEST(NfsVolumes, AddOnAKernelWithoutNfsClientSaysSoAndRecordsNothing)
     const std::string registry = R"({"volumes": [{"name": "moved", "version": "3", "hosts": ["10.0.0.1"],
         "share": "/export", "readOnly": false, "connections": 1, "security": 0, "explicitlyUnmounted": false}]})";
     LinuxTest::WriteFile(dir.Path() + "/state/linux-host.json", registry);
-    for (const auto& args : {std::vector<std::string>{"storage", "filesystem", "mount", "-l", "moved"},
-                             std::vector<std::string>{"storage", "filesystem", "automount"}}) {
-        SCOPED_TRACE(args[2]);
-        std::vector<std::string> full{"--host", "linux"};
-        full.insert(full.end(), args.begin(), args.end());
-        const auto ran = LinuxTest::Autocli(full, env);
+    for (const char* words : {"storage filesystem mount -l moved", "storage filesystem automount"}) {
+        SCOPED_TRACE(words);
+        const auto ran = LinuxTest::Autocli(LinuxTest::Words(std::string("--host linux ") + words), env);
         EXPECT_EQ(ran.exitCode, 1) << ran.out << ran.err;
         EXPECT_NE(ran.err.find(kNoClient), std::string::npos) << ran.err;
     }
@@ -134,23 +128,19 @@ step registry2 cat "$DIR/linux-host.json"
     LinuxTest::ExpectSteps(steps, expectations);
 
     // Lists: the mounted volume from the mount table, the other from the registry.
-    const auto v3 = nlohmann::json::parse(steps["nfslist"].output);
-    ASSERT_EQ(v3.size(), 1u) << v3.dump();
-    EXPECT_EQ(v3[0]["Volume Name"], "vol1");
-    EXPECT_EQ(v3[0]["Host"], "nfs.example");
-    EXPECT_EQ(v3[0]["Share"], "/export/one");
-    EXPECT_EQ(v3[0]["Mounted"], true);
-    EXPECT_EQ(v3[0]["Accessible"], true);
-    EXPECT_EQ(v3[0]["Connections"], 2);
-    EXPECT_EQ(v3[0]["isPE"], false);
-    const auto v41 = nlohmann::json::parse(steps["nfs41list"].output);
-    ASSERT_EQ(v41.size(), 1u) << v41.dump();
-    EXPECT_EQ(v41[0]["Volume Name"], "vol41");
-    EXPECT_EQ(v41[0]["Host(s)"], "a.example,b.example");
-    EXPECT_EQ(v41[0]["Mounted"], false);
-    EXPECT_EQ(v41[0]["Accessible"], false);
-    EXPECT_EQ(v41[0]["Read-Only"], true);
-    EXPECT_EQ(v41[0]["Security"], "krb5");
+    ExpectRow(steps["nfslist"].output, {{"Volume Name", "vol1"},
+                                        {"Host", "nfs.example"},
+                                        {"Share", "/export/one"},
+                                        {"Mounted", true},
+                                        {"Accessible", true},
+                                        {"Connections", 2},
+                                        {"isPE", false}});
+    ExpectRow(steps["nfs41list"].output, {{"Volume Name", "vol41"},
+                                          {"Host(s)", "a.example,b.example"},
+                                          {"Mounted", false},
+                                          {"Accessible", false},
+                                          {"Read-Only", true},
+                                          {"Security", "krb5"}});
     EXPECT_EQ(steps["param"].exitCode, 0) << steps["param"].output;
     // A tmpfs is no block file system: the file system list leaves it out.
     EXPECT_EQ(steps["fslist"].output.find("vol1"), std::string::npos) << steps["fslist"].output;
@@ -159,9 +149,7 @@ step registry2 cat "$DIR/linux-host.json"
     const auto afterUnmount = nlohmann::json::parse(steps["registry1"].output);
     EXPECT_EQ(afterUnmount["volumes"][0]["name"], "vol1");
     EXPECT_EQ(afterUnmount["volumes"][0]["explicitlyUnmounted"], true);
-    const auto after = nlohmann::json::parse(steps["after"].output);
-    ASSERT_EQ(after.size(), 1u);
-    EXPECT_EQ(after[0]["Mounted"], false);
+    ExpectRow(steps["after"].output, {{"Volume Name", "vol1"}, {"Mounted", false}});
     EXPECT_EQ(nlohmann::json::parse(steps["registry2"].output)["volumes"], nlohmann::json::array());
     struct stat st {};
     EXPECT_NE(::stat((state + "/volumes/vol1").c_str(), &st), 0) << "the empty mount point stays behind";

@@ -120,12 +120,8 @@ TEST(Registry, ASecondHolderWaitsThenGivesUp)
     first.Update([](std::vector<RegisteredVolume>&) {});
     ::setenv("AUTOCLI_LOCK_TIMEOUT", "0", 1);
     Registry second(dir.Path());
-    try {
-        second.Update([](std::vector<RegisteredVolume>&) {});
-        ADD_FAILURE() << "the lock was taken twice";
-    } catch (const std::runtime_error& e) {
-        EXPECT_NE(std::string(e.what()).find("is in use by another process"), std::string::npos) << e.what();
-    }
+    const auto message = LinuxTest::ErrorOf([&] { second.Update([](std::vector<RegisteredVolume>&) {}); });
+    EXPECT_NE(message.find("is in use by another process"), std::string::npos) << message;
     ::unsetenv("AUTOCLI_LOCK_TIMEOUT");
 }
 
@@ -150,15 +146,13 @@ TEST(Registry, LinksAreNotFollowed)
         ASSERT_EQ(::mkdir(folder.c_str(), 0755), 0);
         ASSERT_EQ(::symlink(elsewhere.c_str(), (folder + "/" + c.link).c_str()), 0);
         Registry registry(folder);
-        try {
+        const auto message = LinuxTest::ErrorOf([&] {
             if (c.onLoad)
                 registry.Load();
             else
                 registry.Update([](std::vector<RegisteredVolume>&) {});
-            ADD_FAILURE() << "a link was followed";
-        } catch (const std::runtime_error& e) {
-            EXPECT_NE(std::string(e.what()).find(c.message), std::string::npos) << e.what();
-        }
+        });
+        EXPECT_NE(message.find(c.message), std::string::npos) << message;
     }
     EXPECT_EQ(LinuxTest::ReadFile(elsewhere), "{\"volumes\": []}");
 }
@@ -185,14 +179,9 @@ TEST(Registry, RefusesWhatIsNotARegistry)
     for (const auto& c : cases) {
         SCOPED_TRACE(c.text);
         LinuxTest::WriteFile(dir.Path() + "/linux-host.json", c.text);
-        try {
-            registry.Load();
-            ADD_FAILURE() << "accepted";
-        } catch (const std::runtime_error& e) {
-            const std::string message = e.what();
-            EXPECT_EQ(message.rfind("Invalid registry file '" + dir.Path() + "/linux-host.json': ", 0), 0u) << message;
-            EXPECT_NE(message.find(c.what), std::string::npos) << message;
-        }
+        const auto message = LinuxTest::ErrorOf([&] { registry.Load(); });
+        EXPECT_EQ(message.rfind("Invalid registry file '" + dir.Path() + "/linux-host.json': ", 0), 0u) << message;
+        EXPECT_NE(message.find(c.what), std::string::npos) << message;
     }
 }
 
