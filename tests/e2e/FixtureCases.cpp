@@ -3,9 +3,7 @@
 // the host journal they leave behind.
 
 #include <algorithm>
-#include <cstdlib>
 #include <filesystem>
-#include <fstream>
 #include <sstream>
 #include <string>
 #include <vector>
@@ -14,7 +12,9 @@
 #include <nlohmann/json.hpp>
 
 #include "support/Cli.h"
+#include "support/Files.h"
 #include "support/FixtureCase.h"
+#include "support/TempFolder.h"
 
 namespace fs = std::filesystem;
 
@@ -32,55 +32,26 @@ std::vector<std::string> CaseFiles()
     return files;
 }
 
-std::string ReadFile(const fs::path& path)
-{
-    std::ifstream in(path, std::ios::binary);
-    std::ostringstream text;
-    text << in.rdbuf();
-    return text.str();
-}
-
-class TempDir {
-public:
-    TempDir()
-    {
-        std::string pattern = (fs::temp_directory_path() / "autocli-case-XXXXXX").string();
-        if (mkdtemp(pattern.data()) == nullptr) {
-            throw std::runtime_error("mkdtemp failed");
-        }
-        path_ = pattern;
-    }
-    ~TempDir()
-    {
-        std::error_code ignored;
-        fs::remove_all(path_, ignored);
-    }
-    const fs::path& Path() const { return path_; }
-
-private:
-    fs::path path_;
-};
-
 class FixtureCaseTest : public ::testing::TestWithParam<std::string> {};
 
 TEST_P(FixtureCaseTest, MatchesExpectedOutput)
 {
     const fs::path file = fs::path(STORAGECLI_CASES_DIR) / GetParam();
-    const TestSupport::FixtureCase fixture = TestSupport::ParseFixtureCase(ReadFile(file));
+    const TestSupport::FixtureCase fixture = TestSupport::ParseFixtureCase(TestSupport::ReadFile(file));
     ASSERT_FALSE(fixture.steps.empty()) << file << ": no '== run:' step";
 
-    TempDir dir;
-    const fs::path journal = dir.Path() / "journal.jsonl";
+    const TestSupport::TempFolder dir;
+    const std::string journal = dir / "journal.jsonl";
     // A case with a state names its file; one without runs at the default path, inside the
     // case's folder, where the demo host is used until a change writes it.
     std::string state;
     if (fixture.state) {
-        state = (dir.Path() / "host.json").string();
-        std::ofstream(state) << *fixture.state;
+        state = dir / "host.json";
+        TestSupport::WriteFile(state, *fixture.state);
     }
-    std::vector<std::string> env{"XDG_STATE_HOME=" + (dir.Path() / "xdg").string(), "AUTOCLI_STATE="};
+    std::vector<std::string> env{"XDG_STATE_HOME=" + (dir / "xdg"), "AUTOCLI_STATE="};
     env.insert(env.end(), fixture.env.begin(), fixture.env.end());
-    env.push_back("AUTOCLI_JOURNAL=" + journal.string());
+    env.push_back("AUTOCLI_JOURNAL=" + journal);
 
     for (const auto& step : fixture.steps) {
         SCOPED_TRACE(file.string() + ": autocli " + step.commandLine);
@@ -92,7 +63,7 @@ TEST_P(FixtureCaseTest, MatchesExpectedOutput)
 
     if (fixture.expectedJournal) {
         std::vector<nlohmann::json> actual;
-        std::istringstream lines(fs::exists(journal) ? ReadFile(journal) : std::string());
+        std::istringstream lines(TestSupport::ReadFile(journal));
         for (std::string line; std::getline(lines, line);) {
             actual.push_back(nlohmann::json::parse(line));
         }

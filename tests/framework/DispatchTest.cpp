@@ -67,60 +67,56 @@ std::shared_ptr<MetaList> OneRow()
     return list;
 }
 
+void ReturnsOneRow(const Input&, Output& out) { out.SetRootObject(OneRow()); }
+
+void ReturnsRowAndErrors(const Input&, Output& out)
+{
+    out.SetRootObject(OneRow());
+    out.AddErrorMessage("Error getting data for 'w', skipping.");
+    out.AddErrorMessage("");
+}
+
+void ReportsOnlyAnError(const Input&, Output& out) { out.AddErrorMessage("No volume."); }
+void ThrowsStd(const Input&, Output&) { throw std::runtime_error("broken"); }
+
+void ReportsThenThrowsForeign(const Input&, Output& out)
+{
+    out.AddErrorMessage("before");
+    throw HostFailure{"host is down"};
+}
+
+void ThrowsUnknown(const Input&, Output&) { throw 42; }
+
+void ReadsUndeclared(const Input& in, Output& out)
+{
+    if (in.GetParameter("nmae").empty()) {
+        out.SetRootObject(OneRow());
+    }
+}
+
 INSTANTIATE_TEST_SUITE_P(
     Outcomes, Dispatching,
     ::testing::Values(
-        DispatchCase{"result",
-                     [](const Input&, Output& out) { out.SetRootObject(OneRow()); },
-                     {},
-                     0,
-                     "Name  Size  Mounted\n----  ----  -------\nv     1     true\n",
-                     ""},
+        DispatchCase{
+            "result", ReturnsOneRow, {}, 0, "Name  Size  Mounted\n----  ----  -------\nv     1     true\n", ""},
         DispatchCase{"result_with_errors",
-                     [](const Input&, Output& out) {
-                         out.SetRootObject(OneRow());
-                         out.AddErrorMessage("Error getting data for 'w', skipping.");
-                         out.AddErrorMessage("");
-                     },
+                     ReturnsRowAndErrors,
                      {"--formatter", "csv"},
                      1,
                      "Name,Size,Mounted\nv,1,true\n",
                      "Error getting data for 'w', skipping.\n\n"},
-        DispatchCase{"errors_only",
-                     [](const Input&, Output& out) { out.AddErrorMessage("No volume."); },
-                     {},
-                     1,
-                     "",
-                     "No volume.\n"},
-        DispatchCase{
-            "std_exception", [](const Input&, Output&) { throw std::runtime_error("broken"); }, {}, 3, "", "broken\n"},
-        DispatchCase{"foreign_exception_named_by_hook",
-                     [](const Input&, Output& out) {
-                         out.AddErrorMessage("before");
-                         throw HostFailure{"host is down"};
-                     },
-                     {},
-                     3,
-                     "",
-                     "before\nhost is down\n"},
-        DispatchCase{"unknown_exception",
-                     [](const Input&, Output&) { throw 42; },
-                     {},
-                     3,
-                     "",
-                     "An unknown exception stopped the command.\n"},
+        DispatchCase{"errors_only", ReportsOnlyAnError, {}, 1, "", "No volume.\n"},
+        DispatchCase{"std_exception", ThrowsStd, {}, 3, "", "broken\n"},
+        DispatchCase{"foreign_exception_named_by_hook", ReportsThenThrowsForeign, {}, 3, "", "before\nhost is down\n"},
+        DispatchCase{"unknown_exception", ThrowsUnknown, {}, 3, "", "An unknown exception stopped the command.\n"},
         DispatchCase{"undeclared_parameter_read",
-                     [](const Input& in, Output& out) {
-                         if (in.GetParameter("nmae").empty()) {
-                             out.SetRootObject(OneRow());
-                         }
-                     },
+                     ReadsUndeclared,
                      {},
                      3,
                      "",
                      "Command 'cmd' reads parameter 'nmae', which it does not declare.\n"},
         DispatchCase{"usage_error_runs_nothing",
-                     [](const Input&, Output&) {},
+                     ReturnsOneRow,
                      {"--bogus"},
                      2,
                      "",

@@ -28,7 +28,7 @@ std::shared_ptr<InputSpec> OneOfEachKind()
 struct ReadCase {
     const char* name;
     std::function<void(const Input&)> read;
-    const char* error; // "" when the read is allowed
+    std::string error; // "" when the read is allowed
 };
 
 void PrintTo(const ReadCase& c, std::ostream* os) { *os << c.name; }
@@ -40,7 +40,7 @@ TEST_P(Reading, DeclaredNamesOnlyAndAsDeclared)
     const auto& c = GetParam();
     auto in = Input::New();
     in->Declare(OneOfEachKind(), "storage volume set");
-    if (*c.error == '\0') {
+    if (c.error.empty()) {
         EXPECT_NO_THROW(c.read(*in));
         return;
     }
@@ -48,7 +48,7 @@ TEST_P(Reading, DeclaredNamesOnlyAndAsDeclared)
         c.read(*in);
         ADD_FAILURE() << "no exception";
     } catch (const QuilletException& e) {
-        EXPECT_STREQ(e.what(), c.error);
+        EXPECT_EQ(e.what(), c.error);
     }
 }
 
@@ -57,6 +57,11 @@ std::vector<std::string> List(const Input& in, const std::string& name)
     std::vector<std::string> values{"stale"};
     in.GetParameterList(name, values);
     return values;
+}
+
+std::string Undeclared(const std::string& name)
+{
+    return "Command 'storage volume set' reads parameter '" + name + "', which it does not declare.";
 }
 
 INSTANTIATE_TEST_SUITE_P(
@@ -69,18 +74,12 @@ INSTANTIATE_TEST_SUITE_P(
         ReadCase{"flag_as_bool", [](const Input& in) { EXPECT_FALSE(in.GetParameterBool("force")); }, ""},
         ReadCase{"list", [](const Input& in) { EXPECT_TRUE(List(in, "hosts").empty()); }, ""},
         ReadCase{"has_declared", [](const Input& in) { EXPECT_FALSE(in.HasParameter("depth")); }, ""},
-        ReadCase{"misspelt_string", [](const Input& in) { in.GetParameter("nmae"); },
-                 "Command 'storage volume set' reads parameter 'nmae', which it does not declare."},
-        ReadCase{"misspelt_int", [](const Input& in) { in.GetParameterInt("dpeth"); },
-                 "Command 'storage volume set' reads parameter 'dpeth', which it does not declare."},
-        ReadCase{"misspelt_bool", [](const Input& in) { in.GetParameterBool("enable"); },
-                 "Command 'storage volume set' reads parameter 'enable', which it does not declare."},
-        ReadCase{"misspelt_flag", [](const Input& in) { in.IsFlagSet("forced"); },
-                 "Command 'storage volume set' reads parameter 'forced', which it does not declare."},
-        ReadCase{"misspelt_list", [](const Input& in) { List(in, "host"); },
-                 "Command 'storage volume set' reads parameter 'host', which it does not declare."},
-        ReadCase{"has_undeclared", [](const Input& in) { in.HasParameter("Name"); },
-                 "Command 'storage volume set' reads parameter 'Name', which it does not declare."},
+        ReadCase{"misspelt_string", [](const Input& in) { in.GetParameter("nmae"); }, Undeclared("nmae")},
+        ReadCase{"misspelt_int", [](const Input& in) { in.GetParameterInt("dpeth"); }, Undeclared("dpeth")},
+        ReadCase{"misspelt_bool", [](const Input& in) { in.GetParameterBool("enable"); }, Undeclared("enable")},
+        ReadCase{"misspelt_flag", [](const Input& in) { in.IsFlagSet("forced"); }, Undeclared("forced")},
+        ReadCase{"misspelt_list", [](const Input& in) { List(in, "host"); }, Undeclared("host")},
+        ReadCase{"has_undeclared", [](const Input& in) { in.HasParameter("Name"); }, Undeclared("Name")},
         ReadCase{"int_as_string", [](const Input& in) { in.GetParameter("depth"); },
                  "Command 'storage volume set' reads parameter 'depth' as a string, but declares it as an integer."},
         ReadCase{"string_as_int", [](const Input& in) { in.GetParameterInt("name"); },
@@ -93,23 +92,6 @@ INSTANTIATE_TEST_SUITE_P(
                  "Command 'storage volume set' reads parameter 'name' as a string list, but declares it as a string."}),
     [](const auto& info) { return std::string(info.param.name); });
 
-TEST(Reading, GivenValuesReadBackThroughTheDeclaration)
-{
-    auto in = Input::New();
-    in->SetParameter("name", "vol1");
-    in->SetParameterInt("depth", -7);
-    in->SetParameterBool("enabled", true);
-    in->SetFlag("force");
-    in->AddParameterListValue("hosts", "a");
-    in->AddParameterListValue("hosts", "b");
-    in->Declare(OneOfEachKind(), "cmd");
-    EXPECT_EQ(in->GetParameter("name"), "vol1");
-    EXPECT_EQ(in->GetParameterInt("depth"), -7);
-    EXPECT_TRUE(in->GetParameterBool("enabled"));
-    EXPECT_TRUE(in->IsFlagSet("force"));
-    EXPECT_EQ(List(*in, "hosts"), (std::vector<std::string>{"a", "b"}));
-    EXPECT_TRUE(in->HasParameter("depth"));
-    EXPECT_THROW(in->Declare(nullptr, "cmd"), QuilletException);
-}
+TEST(Reading, NeedsADeclaration) { EXPECT_THROW(Input::New()->Declare(nullptr, "cmd"), QuilletException); }
 
 } // namespace

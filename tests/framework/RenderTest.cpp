@@ -1,4 +1,5 @@
 #include <ostream>
+#include <tuple>
 
 #include <gtest/gtest.h>
 
@@ -89,69 +90,50 @@ INSTANTIATE_TEST_SUITE_P(
                    "[\n  {\n    \"Mounted\": true\n  },\n  {\n    \"Mounted\": false\n  }\n]\n"}),
     [](const auto& info) { return std::string(info.param.name); });
 
-TEST(Render, SingleStructureIsOneRowTableAndAnObject)
+std::shared_ptr<MetaStruct> Row(std::vector<std::pair<const char*, std::string>> fields)
 {
-    auto single = Volume("vol", 7, true);
-    EXPECT_EQ(Render(single, "table"), "Name  Size  Mounted\n----  ----  -------\nvol   7     true\n");
-    EXPECT_EQ(Render(single, "simple"), "   Name: vol\n   Size: 7\n   Mounted: true\n");
-    EXPECT_EQ(nlohmann::json::parse(Render(single, "json")),
-              nlohmann::json({{"Name", "vol"}, {"Size", 7}, {"Mounted", true}}));
-}
-
-TEST(Render, BooleanRootIsSilentExceptInJson)
-{
-    for (const char* formatter : {"table", "simple", "csv"}) {
-        EXPECT_EQ(Render(MetaBool::New(true), formatter), "") << formatter;
+    auto row = MetaStruct::New("S");
+    for (const auto& [name, value] : fields) {
+        row->SetField(name, value);
     }
-    EXPECT_EQ(Render(MetaBool::New(true), "json"), "true\n");
-    EXPECT_EQ(Render(MetaBool::New(false), "json"), "false\n");
-    EXPECT_EQ(Render(nullptr, "json"), "");
+    return row;
 }
 
-TEST(Render, EmptyListKeepsHeaderInTableAndIsEmptyArrayInJson)
+TEST(Render, RootShapesPerFormatter)
 {
     auto empty = MetaList::New(MetaType::Struct, VolumeShape());
-    EXPECT_EQ(Render(empty, "table"), "Name  Size  Mounted\n----  ----  -------\n");
-    EXPECT_EQ(Render(empty, "simple"), "");
-    EXPECT_EQ(Render(empty, "json"), "[]\n");
-    EXPECT_EQ(Render(empty, "csv"), "Name,Size,Mounted\n");
-}
-
-TEST(Render, JsonEscapesQuotesBackslashesAndControlCharacters)
-{
-    auto row = MetaStruct::New("S");
-    row->SetField("Text", std::string("a\"b\\c\nd\x01") + "\xff");
-    const auto text = Render(row, "json");
+    auto wide = MetaList::New(MetaType::Struct, nullptr);
+    wide->Add(Row({{"N", "\xC3\xA9t\xC3\xA9"}, {"M", "x"}})); // three characters, five bytes
+    const auto control = Row({{"Text", "two\nlines\t\x1b"}});
+    const auto blanks = Row({{"Empty", ""}, {"Last", ""}});
+    const std::vector<std::tuple<std::shared_ptr<MetaObject>, const char*, std::string>> cases{
+        {Volume("vol", 7, true), "table", "Name  Size  Mounted\n----  ----  -------\nvol   7     true\n"},
+        {Volume("vol", 7, true), "simple", "   Name: vol\n   Size: 7\n   Mounted: true\n"},
+        {Volume("vol", 7, true), "json", "{\n  \"Name\": \"vol\",\n  \"Size\": 7,\n  \"Mounted\": true\n}\n"},
+        {MetaBool::New(true), "table", ""},
+        {MetaBool::New(true), "simple", ""},
+        {MetaBool::New(true), "csv", ""},
+        {MetaBool::New(true), "json", "true\n"},
+        {MetaBool::New(false), "json", "false\n"},
+        {nullptr, "json", ""},
+        {empty, "table", "Name  Size  Mounted\n----  ----  -------\n"},
+        {empty, "simple", ""},
+        {empty, "json", "[]\n"},
+        {empty, "csv", "Name,Size,Mounted\n"},
+        {wide, "table", "N    M\n---  -\n\xC3\xA9t\xC3\xA9  x\n"},
+        // Control characters cannot break a human-readable line; csv quotes them instead.
+        {control, "simple", "   Text: two\\nlines\\t\\x1b\n"},
+        {control, "csv", "Text\n\"two\nlines\t\x1b\"\n"},
+        // Empty values keep the line shape, and table lines never end in padding.
+        {blanks, "simple", "   Empty: \n   Last: \n"},
+        {blanks, "table", "Empty  Last\n-----  ----\n\n"},
+    };
+    for (const auto& [object, formatter, expected] : cases) {
+        EXPECT_EQ(Render(object, formatter), expected) << formatter << " of " << expected;
+    }
+    const auto text = Render(Row({{"Text", std::string("a\"b\\c\nd\x01") + "\xff"}}), "json");
     EXPECT_EQ(text, "{\n  \"Text\": \"a\\\"b\\\\c\\nd\\u0001\xEF\xBF\xBD\"\n}\n");
     EXPECT_EQ(nlohmann::json::parse(text)["Text"], "a\"b\\c\nd\x01\xEF\xBF\xBD");
-}
-
-TEST(Render, ControlCharactersCannotBreakHumanReadableLines)
-{
-    auto row = MetaStruct::New("S");
-    row->SetField("Text", "two\nlines\t\x1b");
-    EXPECT_EQ(Render(row, "simple"), "   Text: two\\nlines\\t\\x1b\n");
-    EXPECT_EQ(Render(row, "csv"), "Text\n\"two\nlines\t\x1b\"\n");
-}
-
-TEST(Render, EmptyValuesKeepTheSimpleLineShape)
-{
-    auto row = MetaStruct::New("S");
-    row->SetField("Empty", "");
-    row->SetField("Last", "");
-    EXPECT_EQ(Render(row, "simple"), "   Empty: \n   Last: \n");
-    // Table lines never end in padding.
-    EXPECT_EQ(Render(row, "table"), "Empty  Last\n-----  ----\n\n");
-}
-
-TEST(Render, TableWidthCountsCharactersNotBytes)
-{
-    auto list = MetaList::New(MetaType::Struct, nullptr);
-    auto row = MetaStruct::New("S");
-    row->SetField("N", "\xC3\xA9t\xC3\xA9"); // three characters, five bytes
-    row->SetField("M", "x");
-    list->Add(row);
-    EXPECT_EQ(Render(list, "table"), "N    M\n---  -\n\xC3\xA9t\xC3\xA9  x\n");
 }
 
 TEST(Render, FieldMissingFromRowShowsDeclaredEmptyValue)
@@ -162,13 +144,6 @@ TEST(Render, FieldMissingFromRowShowsDeclaredEmptyValue)
     list->Add(partial);
     EXPECT_EQ(nlohmann::json::parse(Render(list, "json")),
               nlohmann::json::parse(R"([{"Name":"only-name","Size":0,"Mounted":false}])"));
-}
-
-TEST(Render, FormatterDefaultsToCommandsThenSimple)
-{
-    EXPECT_EQ(EffectiveFormatter({"table", {}}, {}), Formatter::Table);
-    EXPECT_EQ(EffectiveFormatter({"table", {}}, {"csv", std::nullopt, true}), Formatter::Csv);
-    EXPECT_EQ(EffectiveFormatter({}, {}), Formatter::Simple);
 }
 
 TEST(Render, FieldSelectionIsCheckedAgainstDeclaredStructure)

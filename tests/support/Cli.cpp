@@ -6,6 +6,7 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cerrno>
 #include <cstring>
 #include <stdexcept>
@@ -22,19 +23,13 @@ namespace {
 // The current environment with `extra` "NAME=VALUE" entries added or replacing.
 std::vector<std::string> Environment(const std::vector<std::string>& extra)
 {
-    std::vector<std::string> entries;
+    const auto nameOf = [](const std::string& entry) { return entry.substr(0, entry.find('=')); };
+    std::vector<std::string> entries(extra);
     for (char** entry = environ; *entry != nullptr; ++entry) {
-        const std::string text = *entry;
-        const std::string name = text.substr(0, text.find('='));
-        bool replaced = false;
-        for (const auto& addition : extra) {
-            replaced = replaced || addition.substr(0, addition.find('=')) == name;
-        }
-        if (!replaced) {
-            entries.push_back(text);
+        if (std::none_of(extra.begin(), extra.end(), [&](const auto& e) { return nameOf(e) == nameOf(*entry); })) {
+            entries.push_back(*entry);
         }
     }
-    entries.insert(entries.end(), extra.begin(), extra.end());
     return entries;
 }
 

@@ -1,30 +1,15 @@
 #include "support/HostFixture.h"
 
 #include <cstdlib>
-#include <filesystem>
 #include <fstream>
 #include <sstream>
-#include <stdexcept>
 
 #include "host/HostSession.h"
 
 namespace TestSupport {
 
-namespace {
-
-std::string MakeTempDir()
-{
-    const char* base = std::getenv("TMPDIR");
-    std::string pattern = std::string(base && *base ? base : "/tmp") + "/hosttest.XXXXXX";
-    if (!::mkdtemp(pattern.data()))
-        throw std::runtime_error("mkdtemp failed for " + pattern);
-    return pattern;
-}
-
-} // namespace
-
 ScopedHost::ScopedHost(const std::string& stateJson)
-    : dir_(MakeTempDir()), statePath_(dir_ + "/host.json"), journalPath_(dir_ + "/journal.jsonl")
+    : statePath_(dir_ / "host.json"), journalPath_(dir_ / "journal.jsonl")
 {
     if (!stateJson.empty())
         std::ofstream(statePath_, std::ios::binary) << stateJson;
@@ -36,8 +21,6 @@ ScopedHost::~ScopedHost()
 {
     HostSim::CloseSession();
     ::unsetenv("AUTOCLI_JOURNAL");
-    std::error_code ignored;
-    std::filesystem::remove_all(dir_, ignored);
 }
 
 nlohmann::json ScopedHost::State() const

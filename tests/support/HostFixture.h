@@ -5,6 +5,8 @@
 
 #include <nlohmann/json.hpp>
 
+#include "support/TempFolder.h"
+
 namespace TestSupport {
 
 // An in-process host session on a temporary state file, with its own call journal.
@@ -18,7 +20,7 @@ public:
     ScopedHost(const ScopedHost&) = delete;
     ScopedHost& operator=(const ScopedHost&) = delete;
 
-    const std::string& Dir() const { return dir_; }
+    const std::string& Dir() const { return dir_.Path(); }
     const std::string& StatePath() const { return statePath_; }
     const std::string& JournalPath() const { return journalPath_; }
 
@@ -34,7 +36,7 @@ public:
     void Reopen();
 
 private:
-    std::string dir_;
+    TempFolder dir_;
     std::string statePath_;
     std::string journalPath_;
 };
