@@ -23,12 +23,14 @@ void ExpectRuns(const std::vector<Case>& cases, const std::string& prefix, const
         allEnv.insert(allEnv.end(), c.env.begin(), c.env.end());
         const auto ran = LinuxTest::Autocli(LinuxTest::Words(prefix + c.args), allEnv);
         EXPECT_EQ(ran.exitCode, c.exitCode) << ran.out << ran.err;
-        if (*c.out)
+        if (*c.out) {
             EXPECT_EQ(ran.out, c.out);
-        if (*c.err)
+        }
+        if (*c.err) {
             EXPECT_NE(ran.err.find(c.err), std::string::npos) << ran.err;
-        else
+        } else {
             EXPECT_EQ(ran.err, "");
+        }
     }
 }
 
