@@ -90,7 +90,7 @@ INSTANTIATE_TEST_SUITE_P(
                    "[\n  {\n    \"Mounted\": true\n  },\n  {\n    \"Mounted\": false\n  }\n]\n"}),
     [](const auto& info) { return std::string(info.param.name); });
 
-std::shared_ptr<MetaStruct> Row(std::vector<std::pair<const char*, std::string>> fields)
+std::shared_ptr<MetaStruct> Row(const std::vector<std::pair<const char*, std::string>>& fields)
 {
     auto row = MetaStruct::New("S");
     for (const auto& [name, value] : fields) {
